@@ -68,3 +68,10 @@ enum HIDGesturePhase : uint16_t {
 #define HID_PROPERTY(Type, name, Setter)      \
     Type name() const { return name##_; }     \
     void Setter(Type value) { name##_ = value; }
+
+#include <functional>
+
+namespace orvane {
+// The callback that sends one event at once through the event system's dispatcher.
+using HIDDispatchHandler = std::function<void(const HIDEventRef&)>;
+}  // namespace orvane

@@ -94,7 +94,8 @@ LogArgument makeLogArgument(const T& v) {
         a.text = v;
     } else if constexpr (std::is_convertible_v<D, const char*>) {
         a.kind = LogArgument::Kind::Text;
-        a.text = v ? static_cast<const char*>(v) : "(null)";
+        const char* text = v;
+        a.text = text ? text : "(null)";
     } else if constexpr (HasDescription<D>::value) {
         a.kind = LogArgument::Kind::Text;
         a.text = v.description();

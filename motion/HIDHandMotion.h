@@ -1,0 +1,111 @@
+#pragma once
+// The hand's motion from its innermost and outermost touching fingers: translation,
+// scale and rotation, smoothed, clipped to the dominant kind and accumulated, and written
+// back into the path table.
+
+#include <cstdint>
+
+#include "common/HIDTypes.h"
+#include "motion/HIDFingerToPathMap.h"
+
+namespace orvane {
+
+class HIDPathStates;
+
+struct HIDSeparationVector {
+    float x;
+    float y;
+    float magnitude;
+    float direction;
+};
+
+class HIDHandMotion : public HIDFingerToPathMap {
+public:
+    HIDHandMotion() = default;
+
+    // Vector operations.
+    static float getVectorMagnitudeX(float x, float y);
+    static float getVectorDirectionX(float x, float y);
+    static float getVectorDotProduct(HIDPoint a, float unitVectorBdirection);
+    static HIDSeparationVector computeSeparationVector(const HIDContact& innermostCurContact,
+                                                      const HIDContact& outermostCurContact);
+    void computeSeparation_mm(const HIDContact& innermostCurContact, const HIDContact& outermostCurContact);
+    static float scalingFromDotProduct(HIDPoint unitSeparation, HIDPoint innermostMotionV, HIDPoint outermostMotionV);
+    static float rotationFromVectorProduct(HIDPoint unitSeparation, HIDPoint innermostMotionV,
+                                           HIDPoint outermostMotionV);
+    static float getWeightedAverage(float weight, float inputA, float inputB);
+    void setMotionDelta(float x, float y, float scale, float rotate);
+    static void clear2DPlaneMotion(HIDMotion& motion);
+
+    // Extraction.
+    void extractHandMotion(const HIDPathStates& pathTable, HIDParserPath* innermostPath, HIDParserPath* outermostPath,
+                           bool areTouching, bool wereTouching);
+    void extractHandMotionWithResting(const HIDPathStates& pathTable, HIDParserPath* innermostPath,
+                                      HIDParserPath* outermostPath, bool areTouching, bool wereTouching);
+
+    // The per-frame entry.
+    void processHandMotion(HIDPathStates& pathTable, int32_t nTouching, int32_t lastnTouching, uint32_t touchingMask);
+    void clearHandMotion(bool clearLocation);
+    void accumulateHandMotion();
+    void clearAccumulateHandMotion();
+    void resetAccumulateHandMotion();
+    void updateFastestFingerSpeed(const HIDPathStates& pathTable);
+    void clipMotionToDominantAxes(double frameInterval);
+    void computeTrackpadDominanceWeights(float& scaleDominanceWeight, float& rotationDominanceWeight) const;
+    void printExtractedMotion(int numFingers) const;
+    bool anyPixelDeltas() const;
+    float maxPixelDelta() const;
+    float maxAccumPixelDelta() const;
+    float maxAccumPixelDeltaResting() const;
+
+    HID_PROPERTY(HIDMotion, pixelDeltas, setPixelDeltas)
+    HID_PROPERTY(HIDMotion, velocity, setVelocity)
+    HID_PROPERTY(HIDMotion, absoluteLocation, setAbsoluteLocation)
+    HID_PROPERTY(float, innermostOutermostSeparation_mm, setInnermostOutermostSeparation_mm)
+    HID_PROPERTY(float, innermostOutermostVerticalSeparation_mm, setInnermostOutermostVerticalSeparation_mm)
+    HID_PROPERTY(float, maxInnermostOutermostVerticalSeparation_mm, setMaxInnermostOutermostVerticalSeparation_mm)
+    HID_PROPERTY(float, speedSimilarity, setSpeedSimilarity)
+    HID_PROPERTY(HIDMotion, pixelDeltasWithResting, setPixelDeltasWithResting)
+    HID_PROPERTY(bool, startedWithTwoWidelySeparatedFingers, setStartedWithTwoWidelySeparatedFingers)
+    HID_PROPERTY(float, smoothedTranslationSpeed, setSmoothedTranslationSpeed)
+    HID_PROPERTY(float, maxFingerSpeed, setMaxFingerSpeed)
+    HID_PROPERTY(float, averageMaxFingerSpeed, setAverageMaxFingerSpeed)
+    HID_PROPERTY(float, lastMaxFingerSpeed, setLastMaxFingerSpeed)
+    HID_PROPERTY(float, nondominantAxesRatio, setNondominantAxesRatio)
+    HID_PROPERTY(double, tLastPixelDelta, setTLastPixelDelta)
+    HID_PROPERTY(HIDPoint, handCentroid, setHandCentroid)
+    HID_PROPERTY(HIDMotion, smoothedVelocity, setSmoothedVelocity)
+    HID_PROPERTY(HIDMotion, smoothedClippedVelocity, setSmoothedClippedVelocity)
+    HID_PROPERTY(HIDMotion, accumulatedDeltas, setAccumulatedDeltas)
+    HID_PROPERTY(HIDMotion, accumulatedDeltasWithResting, setAccumulatedDeltasWithResting)
+    HID_PROPERTY(HIDMotion, motionDeltas, setMotionDeltas)
+    HID_PROPERTY(HIDMotion, deltas_mm_s, setDeltas_mm_s)
+    HID_PROPERTY(HIDMotion, velocity_mm_s, setVelocity_mm_s)
+
+private:
+    HIDMotion pixelDeltas_{};
+    HIDMotion velocity_{};
+    HIDMotion absoluteLocation_{};
+    float innermostOutermostSeparation_mm_ = 0.0f;
+    float innermostOutermostVerticalSeparation_mm_ = 0.0f;
+    float maxInnermostOutermostVerticalSeparation_mm_ = 0.0f;
+    float speedSimilarity_ = 0.0f;
+    HIDMotion pixelDeltasWithResting_{};
+    bool startedWithTwoWidelySeparatedFingers_ = false;
+    float smoothedTranslationSpeed_ = 0.0f;
+    float maxFingerSpeed_ = 0.0f;
+    float averageMaxFingerSpeed_ = 0.0f;
+    float lastMaxFingerSpeed_ = 0.0f;
+    float nondominantAxesRatio_ = 0.0f;
+    double tLastPixelDelta_ = 0.0;
+    HIDPoint handCentroid_{};
+    HIDMotion smoothedVelocity_{};
+    HIDMotion smoothedClippedVelocity_{};
+    HIDMotion accumulatedDeltas_{};
+    HIDMotion accumulatedDeltasWithResting_{};
+    HIDMotion motionDeltas_{};
+    HIDMotion deltas_mm_s_{};
+    HIDMotion velocity_mm_s_{};
+};
+
+}  // namespace orvane

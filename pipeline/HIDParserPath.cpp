@@ -1,0 +1,7 @@
+#include "HIDParserPath.h"
+
+namespace orvane {
+
+HIDParserPath::HIDParserPath(float height, float width) : surfaceDimensions_{width, height} {}
+
+}  // namespace orvane
