@@ -1,0 +1,17 @@
+#pragma once
+// `orvane frames INPUT --out FILE`: writes the frame recording the filter would be given
+// for INPUT.
+
+#include <string>
+
+namespace orvane::cli {
+
+struct FramesOptions {
+    std::string input;
+    std::string out;
+};
+
+// The process exit status: 0 on success, 1 with one line on standard error otherwise.
+int runFrames(const FramesOptions& options);
+
+}  // namespace orvane::cli

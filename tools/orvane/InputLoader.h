@@ -1,0 +1,15 @@
+#pragma once
+// Reads the command's INPUT, tells its kind from its content and gives the frame
+// recording the filter would be given for it.
+
+#include <string>
+
+#include "tools/formats/FrameRecording.h"
+
+namespace orvane::cli {
+
+// "-" reads standard input (named "<stdin>" in messages). On failure `error` is one line
+// naming the file (and the line where there is one).
+bool loadFrameInput(const std::string& path, formats::FrameRecording* recording, std::string* error);
+
+}  // namespace orvane::cli
