@@ -1,15 +1,217 @@
 #include "HIDPathStateBasic.h"
 
+#include <cmath>
+
+#include "filter/FilterLogging.h"
+
 namespace orvane {
+
+namespace {
+
+// Slots 1..14 carry contacts; contact indices above this are dropped.
+constexpr int kFirstPathID = 1;
+constexpr int kLastPathID = 14;
+constexpr int32_t kHighestContactIndex = 13;
+// Index −1 still addresses a slot (slot 0); anything lower is skipped.
+constexpr int32_t kLowestContactIndex = -1;
+// Scores of the bottom-most search start far below any position.
+constexpr float kNoBottomScore_mm = -100000.0f;
+// A second finger this close to the bottom-most one presses the diving button with it.
+constexpr float kDivingPairMaxVerticalGap_mm = 19.0f;
+constexpr float kDivingPairMaxHorizontalGap_mm = 30.0f;
+
+}  // namespace
 
 HIDPathStateBasic::HIDPathStateBasic(float height, float width) {
     paths_.reserve(kNumPaths);
     for (int i = 0; i < kNumPaths; ++i) paths_.push_back(HIDParserPath::initWithHeight(height, width));
 }
 
-bool HIDPathStateBasic::unpackContactFrame(const HIDEventRef&, double time) {
+bool HIDPathStateBasic::unpackContactFrame(const HIDEventRef& frame, double time) {
     updateFrameTimestamp(time);
+    clearExistingPathLiftoffsAndMasks(frame);
+    if (frame) expandAndFilterPackedContacts(frame);
+    updateFastestFingerSpeed();
     return true;
+}
+
+void HIDPathStateBasic::clearExistingPathLiftoffsAndMasks(const HIDEventRef& frame) {
+    if (!frame) return;
+    for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) {
+        HIDParserPath* path = paths_[slot].get();
+        // The count is asked anew for every slot.
+        if (getNumberOfContacts(frame) == 0) {
+            path->clear();
+        } else if (path->getCurrentContact().fingerTipSwitch == 0) {
+            // A lift-off stays visible for exactly one frame and is wiped here, on the next.
+            path->clear();
+        }
+    }
+}
+
+void HIDPathStateBasic::expandAndFilterPackedContacts(const HIDEventRef& frame) {
+    numNewContacts_ = 0;
+    if (!frame) return;
+    const int n = getNumberOfContacts(frame);
+    const std::vector<HIDEventRef>& children = frame->children();
+    for (int i = 0; i < n; ++i) {
+        // Children are read by position, whatever their type.
+        const HIDEvent& child = *children[static_cast<size_t>(i)];
+        const int32_t index = static_cast<int32_t>(child.integerValueForField(kHIDEventFieldDigitizerIndex));
+        if (index > kHighestContactIndex || index < kLowestContactIndex) continue;
+        HIDParserPath* path = paths_[static_cast<size_t>(index + 1)].get();
+        path->updateCurPrevContactsWith(child, currentTimestamp());
+        if (path->isNewContact()) ++numNewContacts_;
+        // Contacts read before the frame's first new contact get no strong damping and every one
+        // from it on does: the result depends on child order, on purpose.
+        path->filterContactForScreenUI(numNewContacts_ > 0);
+    }
+    countFingersOnDivingButton();
+}
+
+int HIDPathStateBasic::getNumberOfContacts(const HIDEventRef& frame) const {
+    if (!frame) return 0;
+    int count = 0;
+    for (const HIDEventRef& child : frame->children()) count += child->conformsToEventType(kHIDEventTypeDigitizer) ? 1 : 0;
+    return count;
+}
+
+HIDParserPath* HIDPathStateBasic::getParserPath(int slot) const {
+    if (slot < 0 || slot >= static_cast<int>(paths_.size())) return nullptr;
+    return paths_[static_cast<size_t>(slot)].get();
+}
+
+HIDParserPath* HIDPathStateBasic::getParserPathforPathID(int pathID) const {
+    // A cleared path has ID 0; it is never found.
+    if (pathID == 0) return nullptr;
+    for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) {
+        HIDParserPath* path = paths_[static_cast<size_t>(slot)].get();
+        if (path->currentContact().path_id == pathID) return path;
+    }
+    return nullptr;
+}
+
+int HIDPathStateBasic::countFingersOnDivingButton() {
+    static constexpr const char* kSignature = "-[HIDPathStateBasic countFingersOnDivingButton]";
+
+    lastNumTouches_ = numTouches_;
+    numNonEdgeTouches_ = 0;
+    numTouches_ = 0;
+    numPalms_ = 0;
+    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
+        const HIDParserPath* path = getParserPathforPathID(id);
+        if (!path) continue;
+        const bool touchingFinger = path->isTouching() && path->isFingerOrRestingContact();
+        if (touchingFinger && !path->isEdgeContact()) ++numNonEdgeTouches_;
+        if (touchingFinger) ++numTouches_;
+        if (path->isPalmContact()) ++numPalms_;
+    }
+
+    // The bottom-most path: the largest y less the downward excursion it has built up.
+    float bestScore = kNoBottomScore_mm;
+    float secondScore = kNoBottomScore_mm;
+    int bestID = 0;
+    int secondID = 0;
+    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
+        const HIDParserPath* path = getParserPathforPathID(id);
+        if (!path) continue;
+        logVerbose("%s [parserPath isEdgeContact] %d _numNonEdgeTouches %d [parserPath isTouching] %d "
+                   "[parserPath isFingerOrRestingContact ] %d",
+                   kSignature, path->isEdgeContact(), numNonEdgeTouches_, path->isTouching(),
+                   path->isFingerOrRestingContact());
+        // An edge-only palm-type contact counts only while at most one non-edge finger touches.
+        const bool takesPart = path->isTouching() && (path->isFingerOrRestingContact() ||
+                                                      (path->isEdgeContact() && numNonEdgeTouches_ <= 1));
+        if (!takesPart) continue;
+        const float score = path->currentContact().position.y - path->peakDisplacement();
+        logVerbose("%s in here bottom_most_pidx %d peakdisplacement %f ypos_plus %f bottom_most_y_mm%f", kSignature,
+                   bestID, path->peakDisplacement(), score, bestScore);
+        if (score > bestScore) {
+            secondScore = bestScore;
+            secondID = bestID;
+            bestScore = score;
+            bestID = id;
+        } else if (score > secondScore) {
+            secondScore = score;
+            secondID = id;
+        }
+    }
+    bottomDivingPathIndex_ = bestID;
+
+    numFingersOnDivingButton_ = 0;
+    numEdgeTouchesOnDivingButton_ = 0;
+    if (bottomDivingPathIndex_ != 0) {
+        const HIDParserPath* best = getParserPathforPathID(bottomDivingPathIndex_);
+        if (best && best->isContactOnDivingButton()) {
+            numFingersOnDivingButton_ = 1;
+            if (best->isEdgeContact()) numEdgeTouchesOnDivingButton_ = 1;
+        }
+        const HIDParserPath* second = secondID != 0 ? getParserPathforPathID(secondID) : nullptr;
+        if (best && second && numFingersOnDivingButton_ >= 1) {
+            const HIDPoint b = best->currentContact().position;
+            const HIDPoint s = second->currentContact().position;
+            // The second finger counts by closeness alone, never by its own half of the surface:
+            // two fingers pressing the click together.
+            if (fabsf(b.y - s.y) < kDivingPairMaxVerticalGap_mm && fabsf(b.x - s.x) < kDivingPairMaxHorizontalGap_mm) {
+                ++numFingersOnDivingButton_;
+                if (second->isEdgeContact()) ++numEdgeTouchesOnDivingButton_;
+            }
+        }
+    }
+    logVerbose("%s _numFingersOnDivingButton %d _numEdgeTouchesOnDivingButton %d", kSignature,
+               numFingersOnDivingButton_, numEdgeTouchesOnDivingButton_);
+    return numFingersOnDivingButton_;
+}
+
+void HIDPathStateBasic::updateFastestFingerSpeed() {
+    dampedSpeedOfFastestFinger_ = 0.0f;
+    dampedVelocityOfFastestFinger_ = HIDPoint{0.0f, 0.0f};
+    maxFingerSpeed_ = 0.0f;
+
+    float sumSpeed = 0.0f, sumSpeedSquared = 0.0f;
+    float sumAbsX = 0.0f, sumXSquared = 0.0f;
+    float sumAbsY = 0.0f, sumYSquared = 0.0f;
+    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
+        // By slot: a path whose contact carries another ID takes no part.
+        const HIDParserPath* path = getParserPath(id);
+        if (!path || path->currentContact().path_id != id || !path->isTouching()) continue;
+        const float s = path->dampedSpeed();
+        const HIDPoint v = path->dampedVelocity();
+        sumSpeed += s;
+        sumSpeedSquared += s * s;
+        sumAbsX += fabsf(v.x);
+        sumXSquared += v.x * v.x;
+        sumAbsY += fabsf(v.y);
+        sumYSquared += v.y * v.y;
+
+        const HIDPoint d = path->currentContact().velocity;
+        const float squares = d.x * d.x + d.y * d.y;
+        const double length = std::sqrt(static_cast<double>(squares));
+        if (length > maxFingerSpeed_) maxFingerSpeed_ = static_cast<float>(length);
+    }
+    // Weighted means that favour the fastest finger; the velocity components come out as
+    // magnitudes (the sign is squared away), on purpose.
+    if (sumSpeed > 0) dampedSpeedOfFastestFinger_ = sumSpeedSquared / sumSpeed;
+    if (sumAbsX > 0) dampedVelocityOfFastestFinger_.x = sumXSquared / sumAbsX;
+    if (sumAbsY > 0) dampedVelocityOfFastestFinger_.y = sumYSquared / sumAbsY;
+}
+
+bool HIDPathStateBasic::calculateCentroidOfPaths(HIDPoint* centroid) const {
+    HIDPoint sum{0.0f, 0.0f};
+    int count = 0;
+    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
+        const HIDParserPath* path = getParserPath(id);
+        if (!path || path->currentContact().path_id != id) continue;
+        if (!path->isFingerOrRestingContact() || !path->isTouching()) continue;
+        sum.x += path->stablePositionForUI().x;
+        sum.y += path->stablePositionForUI().y;
+        ++count;
+    }
+    if (count > 0 && centroid) {
+        centroid->x = sum.x / static_cast<float>(count);
+        centroid->y = sum.y / static_cast<float>(count);
+    }
+    return count > 0;
 }
 
 }  // namespace orvane
