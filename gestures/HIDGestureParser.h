@@ -17,6 +17,8 @@ class HIDGestureParser {
 public:
     static constexpr int kNumContactIndexes = 15;
 
+    // Flags, out-of-range reports and the generation count start cleared; every byte of
+    // prevFingerType starts as 1.
     HIDGestureParser();
 
     // The UI hand event: the frame event changed in place, or nullptr.
@@ -51,6 +53,9 @@ public:
     const std::array<int32_t, kNumContactIndexes>& prevFingerType() const { return prevFingerType_; }
 
 private:
+    // The closeness of the two fingers that selects the secondary button.
+    static void updateTwoFingersClose(HIDHandStatistics& handStats, const HIDHandMotion& handMotion);
+
     bool shouldEndRotate_ = false;
     bool shouldEndScale_ = false;
     bool shouldCancelScrollMayBegin_ = false;
