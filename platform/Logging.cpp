@@ -1,8 +1,10 @@
 #include "Logging.h"
 
+#include <algorithm>
 #include <cinttypes>
 #include <cstdio>
 #include <map>
+#include <string_view>
 
 namespace orvane {
 

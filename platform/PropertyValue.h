@@ -2,6 +2,7 @@
 // A property-list value: number, boolean, string, data, array or dictionary.
 // Services, clients and plug-in bundles exchange these.
 
+#include <concepts>
 #include <cstdint>
 #include <map>
 #include <memory>
@@ -19,8 +20,10 @@ public:
     enum class Kind { None, Integer, Real, Boolean, String, Data, Array, Dictionary };
 
     PropertyValue() = default;
-    PropertyValue(int v) : kind_(Kind::Integer), integer_(v) {}
-    PropertyValue(int64_t v) : kind_(Kind::Integer), integer_(v) {}
+    // Any integer type but bool is an integer; unsigned values above INT64_MAX wrap.
+    template <std::integral T>
+        requires(!std::same_as<T, bool>)
+    PropertyValue(T v) : kind_(Kind::Integer), integer_(static_cast<int64_t>(v)) {}
     PropertyValue(double v) : kind_(Kind::Real), real_(v) {}
     PropertyValue(bool v) : kind_(Kind::Boolean), integer_(v ? 1 : 0) {}
     PropertyValue(const char* v) : kind_(Kind::String), string_(std::make_shared<std::string>(v)) {}

@@ -48,3 +48,11 @@ TEST(PropertyValue, DescriptionsReadLikeAPropertyList) {
     EXPECT_EQ(PropertyValue(PropertyDictionary{{"k", true}}).description(), "{ k = 1; }");
     EXPECT_EQ(PropertyValue(PropertyDictionary{}).description(), "{}");
 }
+
+TEST(PropertyValue, EveryIntegerTypeMakesAnInteger) {
+    EXPECT_EQ(PropertyValue(7u).integerValue(), 7);
+    EXPECT_EQ(PropertyValue(7ll).integerValue(), 7);
+    EXPECT_EQ(PropertyValue(size_t{7}).kind(), PropertyValue::Kind::Integer);
+    EXPECT_EQ(PropertyValue(short{-2}).integerValue(), -2);
+    EXPECT_EQ(PropertyValue(true).kind(), PropertyValue::Kind::Boolean);
+}
