@@ -46,8 +46,6 @@ bool isValid(const HIDParserPath* path, const HIDContact& contact) {
     return path != nullptr && contact.path_id != 0;
 }
 
-HIDPoint pixelDeltaOf(const HIDParserPath* path) { return path != nullptr ? path->pixelDelta() : HIDPoint{}; }
-
 HIDPoint engagedVelocityOf(const HIDParserPath* path) {
     return path != nullptr ? path->engagedVelocity() : HIDPoint{};
 }
@@ -138,7 +136,8 @@ void HIDHandMotion::clear2DPlaneMotion(HIDMotion& motion) { motion = HIDMotion{0
 
 void HIDHandMotion::extractHandMotion(const HIDPathStates& pathTable, HIDParserPath* innermostPath,
                                       HIDParserPath* outermostPath, bool areTouching, bool wereTouching) {
-    static const char* kSig = "-[HIDHandMotion extractHandMotion:innermostPath:outermostPath:areTouching:wereTouching:]";
+    static const char* kSig =
+        "-[HIDHandMotion extractHandMotion:innermostPath:outermostPath:areTouching:wereTouching:]";
 
     const HIDContact& innerCur = currentContactOf(innermostPath);
     const HIDContact& innerPrev = previousContactOf(innermostPath);
@@ -232,7 +231,7 @@ void HIDHandMotion::extractHandMotionWithResting(const HIDPathStates&, HIDParser
             const HIDPoint u{s.x / s.magnitude, s.y / s.magnitude};
             const float previousSeparation = getVectorMagnitudeX(innerPrev.position.x - outerPrev.position.x,
                                                                  innerPrev.position.y - outerPrev.position.y);
-            const HIDPoint di = pixelDeltaOf(innermostPath);
+            const HIDPoint di = innermostPath->pixelDelta();
             const HIDPoint dO = outermostPath->pixelDelta();
             pixelDeltasWithResting_.x = (dO.x + pixelDeltasWithResting_.x) * 0.5f;
             pixelDeltasWithResting_.y = (dO.y + pixelDeltasWithResting_.y) * 0.5f;
