@@ -116,12 +116,13 @@ HIDEventRef HIDGestureParser::prepareHandEventforUI(HIDHandStatistics& handStats
         const int32_t idx = static_cast<int32_t>(child.integerValueForField(kHIDEventFieldDigitizerIndex));
         if (idx < 0 || idx >= kNumContactIndexes) continue;  // passed through untouched
 
-        const bool touching = child.integerValueForField(kHIDEventFieldDigitizerType) != kHIDDigitizerTransducerTypeHand
-                              && child.integerValueForField(kHIDEventFieldDigitizerTouch) != 0;
+        const bool touching =
+            child.integerValueForField(kHIDEventFieldDigitizerType) != kHIDDigitizerTransducerTypeHand &&
+            child.integerValueForField(kHIDEventFieldDigitizerTouch) != 0;
         if (touching) {
             if (prevFingerType_[idx] == 0) {
-                child.setIntegerValue(child.integerValueForField(kHIDEventFieldDigitizerEventMask) | kHIDDigitizerEventTouch,
-                                      kHIDEventFieldDigitizerEventMask);
+                const int64_t mask = child.integerValueForField(kHIDEventFieldDigitizerEventMask);
+                child.setIntegerValue(mask | kHIDDigitizerEventTouch, kHIDEventFieldDigitizerEventMask);
             }
             sentOutOfRange_[idx] = false;
             prevFingerType_[idx] = 1;
@@ -224,11 +225,12 @@ void HIDGestureParser::parseGesture(HIDHandStatistics& handStats, HIDHandMotion&
 
     // One finger: the pointer.
     if (fingers == 1) {
-        const bool pointerRule = ticksToMilliseconds(now - handStats.t_firstFingerTouchDown()) > kPointerAfterTouchDown_ms &&
-                                 ticksToMilliseconds(now - handStats.t_recentFingerLiftoff()) > kPointerAfterLiftoff_ms &&
-                                 maxAccum > kGestureMotionThreshold_px &&
-                                 ticksToMilliseconds(now - handStats.t_recentScaleEnd()) > kPointerAfterScaleEnd_ms &&
-                                 ticksToMilliseconds(now - handStats.t_recentScrollEnd()) > kPointerAfterScrollEnd_ms;
+        const bool pointerRule =
+            ticksToMilliseconds(now - handStats.t_firstFingerTouchDown()) > kPointerAfterTouchDown_ms &&
+            ticksToMilliseconds(now - handStats.t_recentFingerLiftoff()) > kPointerAfterLiftoff_ms &&
+            maxAccum > kGestureMotionThreshold_px &&
+            ticksToMilliseconds(now - handStats.t_recentScaleEnd()) > kPointerAfterScaleEnd_ms &&
+            ticksToMilliseconds(now - handStats.t_recentScrollEnd()) > kPointerAfterScrollEnd_ms;
         if (pointerRule) {
             if (currentGesture_ < kHIDGestureTypeScroll) {
                 currentGesture_ = kHIDGestureTypePointer;
@@ -259,15 +261,15 @@ void HIDGestureParser::parseGesture(HIDHandStatistics& handStats, HIDHandMotion&
                 const float scaleMagnitude = std::fabs(pixels.scale);
                 const float rotateMagnitude = std::fabs(pixels.rotate);
                 const float largest = scaleMagnitude >= rotateMagnitude ? scaleMagnitude : rotateMagnitude;
+                // The gain is applied in double precision and the result stored as float.
                 if (largest == scaleMagnitude) {  // a tie goes to scale
                     currentGesture_ = kHIDGestureTypeScale;
-                    handMotion.setMotionDelta(0.0f, 0.0f,
-                                              static_cast<float>(static_cast<double>(pixels.scale) * kScaleRotateGain),
-                                              0.0f);
+                    const float scale = static_cast<float>(static_cast<double>(pixels.scale) * kScaleRotateGain);
+                    handMotion.setMotionDelta(0.0f, 0.0f, scale, 0.0f);
                 } else if (largest == rotateMagnitude) {
                     currentGesture_ = kHIDGestureTypeRotate;
-                    handMotion.setMotionDelta(0.0f, 0.0f, 0.0f,
-                                              static_cast<float>(static_cast<double>(pixels.rotate) * kScaleRotateGain));
+                    const float rotate = static_cast<float>(static_cast<double>(pixels.rotate) * kScaleRotateGain);
+                    handMotion.setMotionDelta(0.0f, 0.0f, 0.0f, rotate);
                 }
             }
         }
@@ -331,6 +333,7 @@ HIDEventRef HIDGestureParser::createGestureEvents(HIDHandStatistics& handStats, 
                                                   const HIDEventRef& /*gestureEvent*/,
                                                   const HIDDispatchHandler& dispatcher, bool tapToClickEnabled,
                                                   bool twoFingersSecondaryClickEnabled) {
+    if (!handEvent || !pointerEvent) return nullptr;
     const uint64_t timestamp = handEvent->timestamp();
     const double now = handStats.currentTimestamp();
     const int32_t gesture = currentGesture_;

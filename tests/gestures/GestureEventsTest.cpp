@@ -58,7 +58,8 @@ protected:
         stats.setLastButtonState(last);
     }
     HIDEventRef create(bool tapToClick = true, bool secondaryClick = true) {
-        return parser.createGestureEvents(stats, motion, hand, pointer, nullptr, dispatcher, tapToClick, secondaryClick);
+        return parser.createGestureEvents(stats, motion, hand, pointer, nullptr, dispatcher, tapToClick,
+                                          secondaryClick);
     }
     const HIDEventRef& child(size_t i) const { return pointer->children().at(i); }
     size_t childCount() const { return pointer->children().size(); }
@@ -483,7 +484,8 @@ TEST_F(GestureEventsTest, TwoFingersThatRestThenMoveSendMayBeginBeganChangedAndE
         last = f.fingers;
         t += 8;
     }
-    EXPECT_EQ(sink->messages(), (Messages{created("SCROLL MAY BEGIN"), created("SCROLL BEGAN"), created("END SCROLL")}));
+    EXPECT_EQ(sink->messages(),
+              (Messages{created("SCROLL MAY BEGIN"), created("SCROLL BEGAN"), created("END SCROLL")}));
 }
 
 TEST_F(GestureEventsTest, TwoFingersThatRestAndLiftSendMayBeginThenCancelled) {
@@ -740,6 +742,15 @@ TEST_F(GestureEventsTest, CancellingAnOutstandingMayBeginAppendsACancelledScroll
     EXPECT_EQ(sink->messages(), Messages{kCancelled});
     // Once only.
     EXPECT_EQ(parser.cancelScrollMayBegin(stats, other), nullptr);
+}
+
+TEST_F(GestureEventsTest, WithoutAHandEventNothingIsMade) {
+    button(1, 0);
+    gesture(kHIDGestureTypePointer, kHIDGestureTypeNone);
+    EXPECT_EQ(parser.createGestureEvents(stats, motion, nullptr, pointer, nullptr, dispatcher, true, true), nullptr);
+    EXPECT_TRUE(pointer->children().empty());
+    EXPECT_FALSE(parser.buttonStateWasSent());
+    EXPECT_TRUE(sink->messages().empty());
 }
 
 TEST_F(GestureEventsTest, GestureLinesGoToTheFilterLogAtDefaultLevel) {

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cstdio>
 #include <memory>
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -135,6 +136,7 @@ struct PointerTiming {
     const char* name;
     void (*set)(HIDHandStatistics&, double now);
 };
+std::ostream& operator<<(std::ostream& os, const PointerTiming& p) { return os << p.name; }
 
 class PointerTimingTest : public GestureRecogniserTest, public ::testing::WithParamInterface<PointerTiming> {};
 
@@ -148,11 +150,14 @@ TEST_P(PointerTimingTest, PointerWaitsStrictlyLongerThanItsThreshold) {
 
 INSTANTIATE_TEST_SUITE_P(
     EachTimer, PointerTimingTest,
-    ::testing::Values(
-        PointerTiming{"TouchDown40ms", [](HIDHandStatistics& s, double now) { s.setT_firstFingerTouchDown(ticks(now - 40)); }},
-        PointerTiming{"Liftoff20ms", [](HIDHandStatistics& s, double now) { s.setT_recentFingerLiftoff(ticks(now - 20)); }},
-        PointerTiming{"ScaleEnd70ms", [](HIDHandStatistics& s, double now) { s.setT_recentScaleEnd(ticks(now - 70)); }},
-        PointerTiming{"ScrollEnd50ms", [](HIDHandStatistics& s, double now) { s.setT_recentScrollEnd(ticks(now - 50)); }}),
+    ::testing::Values(PointerTiming{"TouchDown40ms",
+                                    [](HIDHandStatistics& s, double t) { s.setT_firstFingerTouchDown(ticks(t - 40)); }},
+                      PointerTiming{"Liftoff20ms",
+                                    [](HIDHandStatistics& s, double t) { s.setT_recentFingerLiftoff(ticks(t - 20)); }},
+                      PointerTiming{"ScaleEnd70ms",
+                                    [](HIDHandStatistics& s, double now) { s.setT_recentScaleEnd(ticks(now - 70)); }},
+                      PointerTiming{"ScrollEnd50ms",
+                                    [](HIDHandStatistics& s, double now) { s.setT_recentScrollEnd(ticks(now - 50)); }}),
     [](const ::testing::TestParamInfo<PointerTiming>& info) { return std::string(info.param.name); });
 
 TEST_F(GestureRecogniserTest, PointerRuleEndsATwoFingerGestureLeftWithOneFinger) {
@@ -501,6 +506,7 @@ struct GestureEnd {
     const char* name;
     void (*set)(HIDHandStatistics&, double time);
 };
+std::ostream& operator<<(std::ostream& os, const GestureEnd& g) { return os << g.name; }
 
 class TwoFingerTapAfterGestureEndTest : public GestureRecogniserTest,
                                         public ::testing::WithParamInterface<GestureEnd> {};

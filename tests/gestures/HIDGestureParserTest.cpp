@@ -124,6 +124,14 @@ TEST_F(HandEventForUITest, NoPathsYieldsNoneAndMarksPalmsRemoved) {
     EXPECT_TRUE(stats.palmsRemoved());
 }
 
+TEST_F(HandEventForUITest, MissingFrameYieldsNone) {
+    EXPECT_EQ(prepare(nullptr, 2), nullptr);
+    EXPECT_FALSE(stats.palmsRemoved());
+    EXPECT_EQ(prepare(nullptr, 0), nullptr);
+    EXPECT_TRUE(stats.palmsRemoved());
+    EXPECT_EQ(parser.generationCount(), 0);
+}
+
 TEST_F(HandEventForUITest, PalmsRemovedIsRememberedForOneFrame) {
     EXPECT_EQ(prepare(frameEvent(kT, {contact(0, 0.5, 0, 0)}), 1), nullptr);
     EXPECT_TRUE(stats.palmsRemoved());
