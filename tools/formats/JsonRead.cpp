@@ -41,7 +41,17 @@ std::string describeJson(const Json& value) {
     }
 }
 
-bool propertyValueFromJsonValue(const Json& value, PropertyValue* out, std::string* error) {
+namespace {
+
+// Deeper property values are refused: converting, copying and describing them recurses, and a
+// hostile file must not exhaust the stack.
+constexpr int kMaximumPropertyDepth = 64;
+
+bool convertPropertyValue(const Json& value, int depth, PropertyValue* out, std::string* error) {
+    if ((value.is_array() || value.is_object()) && !value.empty() && depth >= kMaximumPropertyDepth) {
+        *error = "property values are nested more than " + std::to_string(kMaximumPropertyDepth) + " deep";
+        return false;
+    }
     switch (value.type()) {
     case Json::value_t::boolean: *out = PropertyValue(value.get<bool>()); return true;
     case Json::value_t::number_integer: *out = PropertyValue(value.get<int64_t>()); return true;
@@ -64,7 +74,7 @@ bool propertyValueFromJsonValue(const Json& value, PropertyValue* out, std::stri
         for (size_t i = 0; i < value.size(); ++i) {
             PropertyValue element;
             std::string inner;
-            if (!propertyValueFromJsonValue(value[i], &element, &inner)) {
+            if (!convertPropertyValue(value[i], depth + 1, &element, &inner)) {
                 *error = "[";
                 *error += std::to_string(i);
                 *error += "]: " + inner;
@@ -80,7 +90,7 @@ bool propertyValueFromJsonValue(const Json& value, PropertyValue* out, std::stri
         for (const auto& [key, element] : value.items()) {
             PropertyValue converted;
             std::string inner;
-            if (!propertyValueFromJsonValue(element, &converted, &inner)) {
+            if (!convertPropertyValue(element, depth + 1, &converted, &inner)) {
                 *error = "\"" + key + "\": " + inner;
                 return false;
             }
@@ -93,6 +103,12 @@ bool propertyValueFromJsonValue(const Json& value, PropertyValue* out, std::stri
         *error = describeJson(value) + " is not a property value";
         return false;
     }
+}
+
+}  // namespace
+
+bool propertyValueFromJsonValue(const Json& value, PropertyValue* out, std::string* error) {
+    return convertPropertyValue(value, 0, out, error);
 }
 
 }  // namespace orvane::formats::detail
