@@ -4,6 +4,7 @@
 #include <iterator>
 
 #include "tools/formats/InputKind.h"
+#include "tools/script/GestureScriptFrames.h"
 
 namespace orvane::cli {
 
@@ -20,6 +21,7 @@ bool loadFrameInput(const std::string& path, formats::FrameRecording* recording,
     } else if (!formats::readFileContent(path, &content, error)) {
         return false;
     }
+    if (script::isGestureScript(content)) return script::readGestureScript(content, name, recording, error);
     const formats::InputKindResult kind = formats::detectInputKind(content);
     switch (kind.kind) {
     case formats::InputKind::FrameRecording: return formats::readFrameRecording(content, name, recording, error);
