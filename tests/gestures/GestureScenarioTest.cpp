@@ -25,6 +25,7 @@
 #include "pipeline/HIDParser.h"
 #include "platform/Logging.h"
 #include "stats/HIDHandStatistics.h"
+#include "tests/support/EventText.h"
 #include "tests/support/FrameBuilder.h"
 
 namespace orvane {
@@ -42,50 +43,8 @@ constexpr double kFrameMs = 8.0;
 // The device's own time runs a little ahead of the host's; it feeds the pipeline only.
 constexpr double kDeviceLeadMs = 3.0;
 
-std::string number(double v) {
-    char buf[32];
-    std::snprintf(buf, sizeof buf, "%g", v == 0.0 ? 0.0 : v);
-    return buf;
-}
-
-std::string phaseName(uint16_t phase) {
-    switch (phase) {
-    case kHIDGesturePhaseNone: return "none";
-    case kHIDGesturePhaseBegan: return "began";
-    case kHIDGesturePhaseChanged: return "changed";
-    case kHIDGesturePhaseEnded: return "ended";
-    case kHIDGesturePhaseCancelled: return "cancelled";
-    case kHIDGesturePhaseMayBegin: return "maybegin";
-    default: return "phase" + std::to_string(phase);
-    }
-}
-
-// "none" for no event, "bare" for a pointer event without children; otherwise "move(dx,dy)"
-// when the pointer moves, then each child: "hand", "button:MASK", "scroll:PHASE(x,y)",
-// "scale:PHASE", "rotate:PHASE".
 std::string render(const HIDEventRef& pointer) {
-    if (!pointer) return "none";
-    std::string out;
-    const double dx = pointer->doubleValueForField(kHIDEventFieldPointerX);
-    const double dy = pointer->doubleValueForField(kHIDEventFieldPointerY);
-    if (dx != 0.0 || dy != 0.0) out += "move(" + number(dx) + "," + number(dy) + ")";
-    for (const HIDEventRef& c : pointer->children()) {
-        if (!out.empty()) out += " ";
-        switch (c->type()) {
-        case kHIDEventTypeDigitizer: out += "hand"; break;
-        case kHIDEventTypeButton:
-            out += "button:" + std::to_string(c->integerValueForField(kHIDEventFieldButtonMask));
-            break;
-        case kHIDEventTypeScroll:
-            out += "scroll:" + phaseName(c->phase()) + "(" + number(c->doubleValueForField(kHIDEventFieldScrollX)) +
-                   "," + number(c->doubleValueForField(kHIDEventFieldScrollY)) + ")";
-            break;
-        case kHIDEventTypeScale: out += "scale:" + phaseName(c->phase()); break;
-        case kHIDEventTypeRotation: out += "rotate:" + phaseName(c->phase()); break;
-        default: out += "type" + std::to_string(c->type()); break;
-        }
-    }
-    return out.empty() ? "bare" : out;
+    return test::pointerEventText(pointer, {.scaleRotateValues = false});
 }
 
 struct FrameResult {

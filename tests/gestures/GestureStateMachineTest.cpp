@@ -13,6 +13,7 @@
 #include "motion/HIDHandMotion.h"
 #include "platform/Logging.h"
 #include "stats/HIDHandStatistics.h"
+#include "tests/support/EventText.h"
 #include "tests/support/FrameBuilder.h"
 
 namespace orvane {
@@ -655,55 +656,7 @@ struct HandSetup {
     float verticalSeparation_mm = 300.0f;
 };
 
-std::string number(double v) {
-    char buf[32];
-    std::snprintf(buf, sizeof buf, "%g", v == 0.0 ? 0.0 : v);
-    return buf;
-}
-
-std::string phaseName(uint16_t phase) {
-    switch (phase) {
-    case kHIDGesturePhaseNone: return "none";
-    case kHIDGesturePhaseBegan: return "began";
-    case kHIDGesturePhaseChanged: return "changed";
-    case kHIDGesturePhaseEnded: return "ended";
-    case kHIDGesturePhaseCancelled: return "cancelled";
-    case kHIDGesturePhaseMayBegin: return "maybegin";
-    default: return "phase" + std::to_string(phase);
-    }
-}
-
-// "move(dx,dy)" when the pointer moves, then each child: "hand", "button:MASK",
-// "scroll:PHASE(x,y)", "scale:PHASE(z)", "rotate:PHASE(z)".
-std::string render(const HIDEventRef& pointer) {
-    if (!pointer) return "none";
-    std::string out;
-    const double dx = pointer->doubleValueForField(kHIDEventFieldPointerX);
-    const double dy = pointer->doubleValueForField(kHIDEventFieldPointerY);
-    if (dx != 0.0 || dy != 0.0) out += "move(" + number(dx) + "," + number(dy) + ")";
-    for (const HIDEventRef& c : pointer->children()) {
-        if (!out.empty()) out += " ";
-        switch (c->type()) {
-        case kHIDEventTypeDigitizer: out += "hand"; break;
-        case kHIDEventTypeButton:
-            out += "button:" + std::to_string(c->integerValueForField(kHIDEventFieldButtonMask));
-            break;
-        case kHIDEventTypeScroll:
-            out += "scroll:" + phaseName(c->phase()) + "(" + number(c->doubleValueForField(kHIDEventFieldScrollX)) +
-                   "," + number(c->doubleValueForField(kHIDEventFieldScrollY)) + ")";
-            break;
-        case kHIDEventTypeScale:
-            out += "scale:" + phaseName(c->phase()) + "(" + number(c->doubleValueForField(kHIDEventFieldScaleZ)) + ")";
-            break;
-        case kHIDEventTypeRotation:
-            out += "rotate:" + phaseName(c->phase()) + "(" + number(c->doubleValueForField(kHIDEventFieldRotationZ)) +
-                   ")";
-            break;
-        default: out += "type" + std::to_string(c->type()); break;
-        }
-    }
-    return out;
-}
+std::string render(const HIDEventRef& pointer) { return test::pointerEventText(pointer, {.bare = ""}); }
 
 class GestureSequenceTest : public ::testing::Test {
 protected:
@@ -721,7 +674,7 @@ protected:
         int maxFingers = 0;
         for (size_t i = 0; i < rows.size(); ++i) {
             const Row& row = rows[i];
-            SCOPED_TRACE("frame " + std::to_string(i) + " at " + number(row.t_ms) + " ms");
+            SCOPED_TRACE("frame " + std::to_string(i) + " at " + test::numberText(row.t_ms) + " ms");
             const double now = ticks(row.t_ms);
             stats.setCurrentTimestamp(now);
             for (int k = 0; k < row.touchDowns; ++k) {

@@ -12,7 +12,7 @@
 #include "paths/HIDPathStates.h"
 #include "pipeline/HIDParser.h"
 #include "stats/HIDHandStatistics.h"
-#include "tests/support/FrameBuilder.h"
+#include "tests/support/PipelineScenario.h"
 
 namespace orvane {
 namespace {
@@ -20,29 +20,8 @@ namespace {
 using test::Hand;
 using test::TestClock;
 
-constexpr float kWidth = 1024.0f;
-constexpr float kHeight = 512.0f;
-constexpr double kFrameMs = 8.0;
-
-class RestingThumbScenario : public ::testing::Test {
+class RestingThumbScenario : public test::PipelineScenario {
 protected:
-    TestClock clock;
-    Hand hand{kWidth, kHeight, clock};
-    HIDParser parser{[](const HIDEventRef&) {}, kHeight, kWidth};
-    HIDEventRef frame;
-    double frameTime = 0.0;
-
-    HIDPathStates& table() { return *parser.pathStates(); }
-    const HIDHandStatistics& stats() { return *parser.handStats(); }
-    HIDParserPath& path(int id) { return *table().getParserPath(id); }
-
-    // Sends the hand's current frame, then moves the clock on by one frame.
-    void send() {
-        frame = hand.frame();
-        frameTime = static_cast<double>(clock.ticks());
-        parser.handleContactFrame(frameTime, frame);
-        clock.advance(kFrameMs);
-    }
     // The event mask of the frame's contact with this index, as it left the filter.
     int64_t maskOf(int index) const {
         for (const HIDEventRef& c : frame->children()) {

@@ -9,7 +9,7 @@
 #include "paths/HIDPathStates.h"
 #include "pipeline/HIDParser.h"
 #include "stats/HIDHandStatistics.h"
-#include "tests/support/FrameBuilder.h"
+#include "tests/support/PipelineScenario.h"
 
 namespace orvane {
 namespace {
@@ -17,25 +17,7 @@ namespace {
 using test::Hand;
 using test::TestClock;
 
-constexpr float kWidth = 1024.0f;
-constexpr float kHeight = 512.0f;
-constexpr double kFrameMs = 8.0;
-
-class HandStatisticsScenario : public ::testing::Test {
-protected:
-    TestClock clock;
-    Hand hand{kWidth, kHeight, clock};
-    HIDParser parser{[](const HIDEventRef&) {}, kHeight, kWidth};
-    double frameTime = 0.0;
-
-    const HIDHandStatistics& stats() { return *parser.handStats(); }
-
-    void send() {
-        frameTime = static_cast<double>(clock.ticks());
-        parser.handleContactFrame(frameTime, hand.frame());
-        clock.advance(kFrameMs);
-    }
-};
+using HandStatisticsScenario = test::PipelineScenario;
 
 TEST_F(HandStatisticsScenario, TouchDownsAndLiftOffsFrameByFrame) {
     // Frame 1: the first finger.
