@@ -384,28 +384,36 @@ void writeTimeline(std::ostream& out, const Timeline& timeline) {
         r.what = describeEpisode(e);
         rows.push_back(std::move(r));
     }
-    size_t wFrom = 4, wTo = 0, wFirst = 0, wLast = 0, wKind = 7;  // at least "time", "gesture"
+    size_t wFrom = 0, wTo = 0, wFirst = 0, wLast = 0;
     for (const Row& r : rows) {
         wFrom = std::max(wFrom, r.from.size());
         wTo = std::max(wTo, r.to.size());
         wFirst = std::max(wFirst, r.first.size());
         wLast = std::max(wLast, r.last.size());
-        wKind = std::max(wKind, r.kind.size());
     }
     auto padLeft = [](const std::string& s, size_t w) { return std::string(w > s.size() ? w - s.size() : 0, ' ') + s; };
     auto padRight = [](const std::string& s, size_t w) { return s + std::string(w > s.size() ? w - s.size() : 0, ' '); };
+    // "from - to" with the numbers of every row lined up.
     auto span = [&](const std::string& a, const std::string& b, size_t wa, size_t wb, bool alignRight) {
         std::string s = alignRight ? padLeft(a, wa) : padRight(a, wa);
         if (wb) s += b.empty() ? std::string(wb + 3, ' ') : " - " + padRight(b, wb);
         return s;
     };
-    const size_t wTime = wFrom + (wTo ? wTo + 3 : 0);
-    const size_t wInputs = wFirst + (wLast ? wLast + 3 : 0);
+    std::vector<std::string> times, inputs;
+    size_t wTime = 4, wInputs = 6, wKind = 7;  // "time", "inputs", "gesture"
+    for (const Row& r : rows) {
+        times.push_back(span(r.from, r.to, wFrom, wTo, true));
+        inputs.push_back(span(r.first, r.last, wFirst, wLast, false));
+        wTime = std::max(wTime, times.back().size());
+        wInputs = std::max(wInputs, inputs.back().size());
+        wKind = std::max(wKind, r.kind.size());
+    }
     out << "  " << padRight("time", wTime) << "  " << padRight("inputs", wInputs) << "  " << padRight("gesture", wKind)
         << "  what\n";
-    for (const Row& r : rows) {
-        out << "  " << span(r.from, r.to, wFrom, wTo, true) << "  " << span(r.first, r.last, wFirst, wLast, false)
-            << "  " << padRight(r.kind, wKind) << "  " << r.what << '\n';
+    for (size_t i = 0; i < rows.size(); ++i) {
+        std::string line = "  " + padRight(times[i], wTime) + "  " + padRight(inputs[i], wInputs) + "  " +
+                           padRight(rows[i].kind, wKind) + "  " + rows[i].what;
+        out << line << '\n';
     }
     out << "Counts: " << describeCounts(timeline.counts) << '\n';
 }

@@ -15,6 +15,7 @@
 #include "platform/HIDEventService.h"
 #include "platform/Logging.h"
 #include "platform/Timebase.h"
+#include "tools/analysis/Timeline.h"
 #include "tools/formats/EventJson.h"
 #include "tools/formats/EventStreamWriter.h"
 #include "tools/formats/LogStreamSink.h"
@@ -86,9 +87,12 @@ std::string located(const formats::FrameRecording& recording, size_t line, const
 }
 
 void printSummary(std::ostream& out, const formats::FrameRecording& recording, const host::PlugInHost& host,
-                  int64_t score, const Tally& tally, const std::map<LogLevel, size_t>& logCounts) {
+                  int64_t score, const analysis::Timeline& timeline, const Tally& tally,
+                  const std::map<LogLevel, size_t>& logCounts) {
     out << "Replayed " << recording.name << " through " << host.info().className << " (matched with score "
-        << score << ")\n";
+        << score << ")\n\n";
+    analysis::writeTimeline(out, timeline);
+    out << '\n';
     out << "  records:     " << recording.records.size() << " (" << tally.events << " events, "
         << tally.setProperties << " setProperty, " << tally.clients << " client)\n";
     out << "  returned:    " << tally.returned << " events, " << tally.returnedNone << " none\n";
@@ -164,11 +168,13 @@ int runReplay(const ReplayOptions& options) {
     Logging::setSink(logSink);
 
     Tally tally;
+    analysis::TimelineBuilder timeline(recording.header.timebase, recording.name);
     int64_t input = -1;
     auto dispatcher = std::make_shared<CallbackEventDispatcher>([&](const HIDEventRef& event) {
         if (!event) return;
         ++tally.dispatched;
         tally.countTypes(*event);
+        timeline.addDispatched(input, *event);
         // Written now: the filter may change the event once it has been sent.
         if (events) events->writeDispatched(input, *event);
     });
@@ -194,6 +200,7 @@ int runReplay(const ReplayOptions& options) {
         case formats::InputRecord::Kind::Event: {
             ++tally.events;
             HIDEventRef result;
+            timeline.addFrame(input, record.event->timestamp());
             if (!host.filterEvent(record.event, &result, &error)) return fail(located(recording, record.line, error));
             if (result) {
                 ++tally.returned;
@@ -201,6 +208,7 @@ int runReplay(const ReplayOptions& options) {
             } else {
                 ++tally.returnedNone;
             }
+            timeline.addReturned(input, result.get());
             if (events) events->writeReturned(input, result.get());
             break;
         }
@@ -211,11 +219,13 @@ int runReplay(const ReplayOptions& options) {
             if (!host.setProperty(record.propertyValue, record.propertyKey, client, &accepted, &error))
                 return fail(located(recording, record.line, error));
             if (accepted) ++tally.propertiesAccepted;
+            timeline.addSetting(input, record.propertyKey, record.propertyValue, accepted);
             if (events) events->writeSetProperty(input, record.propertyKey, accepted);
             break;
         }
         case formats::InputRecord::Kind::Client: {
             ++tally.clients;
+            timeline.addOtherRecord(input);
             HIDConnectionRef& client = clients[record.clientID];
             if (!client) client = std::make_shared<HIDConnection>(record.clientID);
             std::erase(connected, client);
@@ -237,7 +247,7 @@ int runReplay(const ReplayOptions& options) {
     // The summary stays off standard output when a stream is written there.
     std::ostream& summary =
         (eventsFile.isStandardOutput() || logFile.isStandardOutput()) ? std::cerr : std::cout;
-    printSummary(summary, recording, host, score, tally, logCounts);
+    printSummary(summary, recording, host, score, timeline.finish(), tally, logCounts);
     return 0;
 }
 
