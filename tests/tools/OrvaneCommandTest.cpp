@@ -197,12 +197,15 @@ TEST(OrvaneCommand, ReplayOfTheBundledRecordingThroughTheRealFilter) {
     EXPECT_NE(r.out.find("through OrvaneServiceFilter (matched with score 500)"), std::string::npos) << r.out;
 }
 
-TEST(OrvaneCommand, EvemuRecordingsAreNotSupportedYet) {
+TEST(OrvaneCommand, EvemuRecordingWithoutSlotsIsOneLine) {
     ScratchFolder scratch;
     const std::string input = scratch.write("pad.evemu", "# EVEMU 1.3\nN: Touchpad\nI: 0011 0002 0007 01b1\n");
-    expectOneErrorLine(runOrvane({"frames", input, "--out", "-"}), input + ": evemu recordings are not supported yet");
-    expectOneErrorLine(runOrvane({"replay", input}, {fakePlugIn()}),
-                       input + ": evemu recordings are not supported yet");
+    const std::string expected = input +
+                                 ":2: a single-touch device: its description has no A: line for ABS_MT_POSITION_X, "
+                                 "ABS_MT_POSITION_Y, ABS_MT_SLOT and ABS_MT_TRACKING_ID, and the conversion needs "
+                                 "multitouch slots with tracking IDs (protocol B)";
+    expectOneErrorLine(runOrvane({"frames", input, "--out", "-"}), expected);
+    expectOneErrorLine(runOrvane({"replay", input}, {fakePlugIn()}), expected);
 }
 
 TEST(OrvaneCommand, MissingInputFileIsOneLine) {

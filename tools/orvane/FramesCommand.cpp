@@ -10,7 +10,7 @@ namespace orvane::cli {
 int runFrames(const FramesOptions& options) {
     std::string error;
     formats::FrameRecording recording;
-    if (!loadFrameInput(options.input, &recording, &error)) {
+    if (!loadFrameInput(options.input, options.evemu, &recording, &error)) {
         std::cerr << error << '\n';
         return 1;
     }

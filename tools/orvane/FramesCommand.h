@@ -4,11 +4,14 @@
 
 #include <string>
 
+#include "tools/evemu/EvemuConversion.h"
+
 namespace orvane::cli {
 
 struct FramesOptions {
     std::string input;
     std::string out;
+    evemu::EvemuOptions evemu;  // how to read an evemu recording
 };
 
 // The process exit status: 0 on success, 1 with one line on standard error otherwise.

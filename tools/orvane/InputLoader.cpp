@@ -9,6 +9,12 @@
 namespace orvane::cli {
 
 bool loadFrameInput(const std::string& path, formats::FrameRecording* recording, std::string* error) {
+    return loadFrameInput(path, evemu::EvemuOptions{}, recording, error);
+}
+
+bool loadFrameInput(const std::string& path, const evemu::EvemuOptions& evemuOptions,
+                    formats::FrameRecording* recording, std::string* error, bool* isEvemu) {
+    if (isEvemu) *isEvemu = false;
     std::string content;
     std::string name = path;
     if (path == "-") {
@@ -21,11 +27,18 @@ bool loadFrameInput(const std::string& path, formats::FrameRecording* recording,
     } else if (!formats::readFileContent(path, &content, error)) {
         return false;
     }
-    if (script::isGestureScript(content)) return script::readGestureScript(content, name, recording, error);
     const formats::InputKindResult kind = formats::detectInputKind(content);
+    if (evemuOptions.any() && kind.kind != formats::InputKind::Evemu) {
+        *error = "orvane: --desc, --size, --keyboard-cover, --tap-to-click and --secondary-click are for evemu "
+                 "recordings, and " + name + " is not one";
+        return false;
+    }
+    if (script::isGestureScript(content)) return script::readGestureScript(content, name, recording, error);
     switch (kind.kind) {
     case formats::InputKind::FrameRecording: return formats::readFrameRecording(content, name, recording, error);
-    case formats::InputKind::Evemu: *error = name + ": evemu recordings are not supported yet"; return false;
+    case formats::InputKind::Evemu:
+        if (isEvemu) *isEvemu = true;
+        return evemu::convertEvemuRecording(content, path, name, evemuOptions, recording, error);
     case formats::InputKind::Unknown:
         *error = name + ":" + std::to_string(kind.line) + ": not a frame recording";
         return false;

@@ -4,6 +4,7 @@
 
 #include <string>
 
+#include "tools/evemu/EvemuConversion.h"
 #include "tools/formats/FrameRecording.h"
 
 namespace orvane::cli {
@@ -11,5 +12,10 @@ namespace orvane::cli {
 // "-" reads standard input (named "<stdin>" in messages). On failure `error` is one line
 // naming the file (and the line where there is one).
 bool loadFrameInput(const std::string& path, formats::FrameRecording* recording, std::string* error);
+
+// The same, with the options of an evemu recording (refused for any other kind of input);
+// `isEvemu` says whether INPUT was one.
+bool loadFrameInput(const std::string& path, const evemu::EvemuOptions& evemuOptions,
+                    formats::FrameRecording* recording, std::string* error, bool* isEvemu = nullptr);
 
 }  // namespace orvane::cli

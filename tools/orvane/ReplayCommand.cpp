@@ -141,7 +141,8 @@ int runReplay(const ReplayOptions& options) {
     std::string error;
     const std::string inputPath = options.input.empty() ? demoRecordingPath() : options.input;
     formats::FrameRecording recording;
-    if (!loadFrameInput(inputPath, &recording, &error)) return fail(error);
+    bool isEvemu = false;
+    if (!loadFrameInput(inputPath, options.evemu, &recording, &error, &isEvemu)) return fail(error);
 
     const TimebaseInfo timebase = recording.header.timebase;
     if (!Timebase::set(timebase.numer, timebase.denom)) {
@@ -186,8 +187,13 @@ int runReplay(const ReplayOptions& options) {
     if (!host.load(plugInPath, recording.header.bundle.value_or(PropertyDictionary{}), &error))
         return fail("orvane: " + error);
     int64_t score = 0;
-    if (!host.matchService(service, {}, &score, &error) || !host.createFilter(service, &error))
+    if (!host.matchService(service, {}, &score, &error)) {
+        if (isEvemu && !options.evemu.keyboardCover)
+            error = "the filter did not match this touchpad: it takes only the trackpad of a keyboard cover (touch "
+                    "pad, finger and keyboard usages); add --keyboard-cover to replay the recording as one";
         return fail(located(recording, recording.headerLine, error));
+    }
+    if (!host.createFilter(service, &error)) return fail(located(recording, recording.headerLine, error));
     if (!host.activate(dispatcher, &error)) return fail("orvane: " + error);
 
     std::map<uint64_t, HIDConnectionRef> clients;

@@ -5,6 +5,8 @@
 
 #include <string>
 
+#include "tools/evemu/EvemuConversion.h"
+
 namespace orvane::cli {
 
 struct ReplayOptions {
@@ -13,6 +15,7 @@ struct ReplayOptions {
     std::string logOut;     // empty: no log stream
     std::string plugIn;     // empty: ORVANE_PLUGIN_PATH or the build's plug-in folder
     bool verbose = false;
+    evemu::EvemuOptions evemu;  // how to read an evemu recording
 };
 
 // The bundled demonstration recording.

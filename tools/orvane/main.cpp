@@ -10,9 +10,43 @@
 
 #include "FramesCommand.h"
 #include "ReplayCommand.h"
+#include "tools/evemu/EvemuConversion.h"
 #include "tools/host/PlugInHost.h"
 
 namespace {
+
+// The options that say how to read an evemu recording; both commands take them.
+void addEvemuOptions(CLI::App* command, orvane::evemu::EvemuOptions& options) {
+    command->add_option("--desc", options.descriptionPath,
+                        "Evemu: the device description (N:, I:, P:, B:, A: lines) of an events file without one. "
+                        "Default: a .desc file beside it (for a.b.events, a.b.desc or a.desc).")
+        ->type_name("FILE");
+    command
+        ->add_option_function<std::string>(
+            "--size",
+            [&options](const std::string& text) {
+                orvane::evemu::SurfaceSize size;
+                std::string error;
+                if (orvane::evemu::parseSurfaceSize(text, &size, &error)) options.size = size;
+            },
+            "Evemu: the touchpad's surface in millimetres, needed when the description gives no resolution; "
+            "replaces the size worked out from the resolutions.")
+        ->type_name("WIDTHxHEIGHT")
+        ->check(CLI::Validator(
+            [](std::string& text) {
+                orvane::evemu::SurfaceSize size;
+                std::string error;
+                return orvane::evemu::parseSurfaceSize(text, &size, &error) ? std::string() : error;
+            },
+            "WIDTHxHEIGHT"));
+    command->add_flag("--keyboard-cover", options.keyboardCover,
+                      "Evemu: present the touchpad as the trackpad of a keyboard cover (adds the keyboard usage), the "
+                      "only device the filter matches.");
+    command->add_flag("--tap-to-click", options.tapToClick,
+                      "Evemu: a client turns tap-to-click on before the first frame.");
+    command->add_flag("--secondary-click", options.secondaryClick,
+                      "Evemu: a client turns two-finger secondary click on before the first frame.");
+}
 
 // CLI11's messages, one line each.
 std::string oneLine(std::string text) {
@@ -32,13 +66,15 @@ int run(int argc, char** argv) {
         "frames",
         "Write the frame recording the filter would be given for INPUT (the kind of INPUT is told from its "
         "content).");
-    framesCommand->add_option("INPUT", frames.input, "Input file: a frame recording (*.frames.jsonl); - reads "
+    framesCommand->add_option("INPUT", frames.input, "Input file: a frame recording (*.frames.jsonl), an evemu "
+                                                     "recording of a touchpad or a gesture script; - reads "
                                                      "standard input.")
         ->required()
         ->type_name("FILE");
     framesCommand->add_option("--out,-o", frames.out, "Where to write the frame recording; - is standard output.")
         ->required()
         ->type_name("FILE");
+    addEvemuOptions(framesCommand, frames.evemu);
 
     orvane::cli::ReplayOptions replay;
     CLI::App* replayCommand = app.add_subcommand(
@@ -46,7 +82,8 @@ int run(int argc, char** argv) {
         "Run INPUT through the filter as the host would (match, construct, configure, activate, one event at a "
         "time, cancel) and print a summary.");
     replayCommand->add_option("INPUT", replay.input,
-                              "Input file: a frame recording (*.frames.jsonl); - reads standard input. Default: "
+                              "Input file: a frame recording (*.frames.jsonl), an evemu recording of a touchpad or "
+                              "a gesture script; - reads standard input. Default: "
                               "the bundled demonstration recording " +
                                   orvane::cli::demoRecordingPath() + ".")
         ->type_name("FILE");
@@ -67,6 +104,7 @@ int run(int argc, char** argv) {
                               "$ORVANE_PLUGIN_PATH, else " +
                                   orvane::host::PlugInHost::builtInPlugInDirectory() + ".")
         ->type_name("PATH");
+    addEvemuOptions(replayCommand, replay.evemu);
 
     try {
         app.parse(argc, argv);
