@@ -4,6 +4,7 @@
 #include <array>
 #include <cmath>
 #include <cstdlib>
+#include <limits>
 
 #include "filter/FilterLogging.h"
 
@@ -13,6 +14,14 @@ namespace {
 
 constexpr int kFirstPathID = 1;
 constexpr int kLastPathID = 14;
+
+// The path ID a contact names: its 32-bit index plus one. The largest index names no path
+// (0) instead of overflowing.
+int pathIDOfContact(const HIDEvent& contact) {
+    const int32_t index = static_cast<int32_t>(contact.integerValueForField(kHIDEventFieldDigitizerIndex));
+    return index == std::numeric_limits<int32_t>::max() ? 0 : index + 1;
+}
+
 constexpr int kMaxPaths = 14;
 constexpr size_t kMaxCosines = kMaxPaths * (kMaxPaths - 1) / 2;
 
@@ -120,7 +129,7 @@ void HIDPathStates::postFilteringTasks(const HIDEventRef& frame) {
 void HIDPathStates::setRestingFlag(const HIDEventRef& frame) {
     if (!frame) return;
     for (const HIDEventRef& child : frame->children()) {
-        const int id = static_cast<int>(child->integerValueForField(kHIDEventFieldDigitizerIndex)) + 1;
+        const int id = pathIDOfContact(*child);
         const HIDParserPath* path = getParserPathforPathID(id);
         const int64_t mask = child->integerValueForField(kHIDEventFieldDigitizerEventMask);
         if (path && path->isRestingInThumbZone() && path->isTouching() && path->wasTouching()) {
@@ -322,7 +331,7 @@ void HIDPathStates::calculateNewHandCenter(const HIDEventRef& frame) {
     int count = 0;
     for (const HIDEventRef& child : frame->children()) {
         if (!child->conformsToEventType(kHIDEventTypeDigitizer)) continue;
-        const int id = static_cast<int>(child->integerValueForField(kHIDEventFieldDigitizerIndex)) + 1;
+        const int id = pathIDOfContact(*child);
         const HIDParserPath* path = getParserPathforPathID(id);
         if (path && path->isRestingInThumbZone()) continue;
         // The raw digitizer values: normalised, y not flipped.
