@@ -57,7 +57,7 @@ LoggingState& state() {
     return s;
 }
 
-void appendFormatted(std::string& out, const std::string& spec, const LogArgument& a, char conv) {
+void appendFormatted(std::string& out, const std::string& directive, const LogArgument& a, char conv) {
     char buf[512];
     int n = 0;
     switch (conv) {
@@ -67,7 +67,7 @@ void appendFormatted(std::string& out, const std::string& spec, const LogArgumen
                     : a.kind == LogArgument::Kind::Unsigned ? static_cast<int64_t>(a.u)
                     : a.kind == LogArgument::Kind::Real     ? static_cast<int64_t>(a.d)
                                                             : 0;
-        n = std::snprintf(buf, sizeof buf, (spec + PRId64).c_str(), v);
+        n = std::snprintf(buf, sizeof buf, (directive + PRId64).c_str(), v);
         break;
     }
     case 'u':
@@ -78,13 +78,13 @@ void appendFormatted(std::string& out, const std::string& spec, const LogArgumen
                      : a.kind == LogArgument::Kind::Signed ? static_cast<uint64_t>(a.s)
                      : a.kind == LogArgument::Kind::Real   ? static_cast<uint64_t>(a.d)
                                                            : 0;
-        std::string f = spec + (conv == 'u' ? PRIu64 : conv == 'x' ? PRIx64 : conv == 'X' ? PRIX64 : PRIo64);
+        std::string f = directive + (conv == 'u' ? PRIu64 : conv == 'x' ? PRIx64 : conv == 'X' ? PRIX64 : PRIo64);
         n = std::snprintf(buf, sizeof buf, f.c_str(), v);
         break;
     }
     case 'c': {
         int v = static_cast<int>(a.kind == LogArgument::Kind::Unsigned ? a.u : a.s);
-        n = std::snprintf(buf, sizeof buf, (spec + "c").c_str(), v);
+        n = std::snprintf(buf, sizeof buf, (directive + "c").c_str(), v);
         break;
     }
     case 'f':
@@ -99,17 +99,17 @@ void appendFormatted(std::string& out, const std::string& spec, const LogArgumen
                    : a.kind == LogArgument::Kind::Signed   ? static_cast<double>(a.s)
                    : a.kind == LogArgument::Kind::Unsigned ? static_cast<double>(a.u)
                                                            : 0.0;
-        n = std::snprintf(buf, sizeof buf, (spec + conv).c_str(), v);
+        n = std::snprintf(buf, sizeof buf, (directive + conv).c_str(), v);
         break;
     }
     case 's':
     case '@': {
         if (a.kind == LogArgument::Kind::Text) {
-            if (spec == "%") {
+            if (directive == "%") {
                 out += a.text;
                 return;
             }
-            n = std::snprintf(buf, sizeof buf, (spec + "s").c_str(), a.text.c_str());
+            n = std::snprintf(buf, sizeof buf, (directive + "s").c_str(), a.text.c_str());
         } else if (a.kind == LogArgument::Kind::Pointer) {
             out += a.p ? "<object>" : "(null)";
             return;
@@ -125,10 +125,10 @@ void appendFormatted(std::string& out, const std::string& spec, const LogArgumen
     case 'p': {
         const void* p = a.kind == LogArgument::Kind::Pointer ? a.p
                                                              : reinterpret_cast<const void*>(static_cast<uintptr_t>(a.u));
-        n = std::snprintf(buf, sizeof buf, (spec + "p").c_str(), p);
+        n = std::snprintf(buf, sizeof buf, (directive + "p").c_str(), p);
         break;
     }
-    default: out += spec; out += conv; return;
+    default: out += directive; out += conv; return;
     }
     if (n > 0) out.append(buf, std::min<size_t>(static_cast<size_t>(n), sizeof buf - 1));
 }
@@ -148,19 +148,19 @@ std::string formatLogMessage(const char* format, const std::vector<LogArgument>&
             ++p;
             continue;
         }
-        std::string spec = "%";
+        std::string directive = "%";
         const char* q = p + 1;
-        while (*q && std::string_view("-+ #0123456789.*").find(*q) != std::string_view::npos) spec += *q++;
+        while (*q && std::string_view("-+ #0123456789.*").find(*q) != std::string_view::npos) directive += *q++;
         while (*q && std::string_view("hlLqjzt").find(*q) != std::string_view::npos) ++q;  // lengths: ours are 64-bit
         if (!*q) {
-            out += spec;
+            out += directive;
             break;
         }
         const char conv = *q;
         if (next < args.size()) {
-            appendFormatted(out, spec, args[next++], conv);
+            appendFormatted(out, directive, args[next++], conv);
         } else {
-            out += spec;
+            out += directive;
             out += conv;
         }
         p = q;
