@@ -32,8 +32,9 @@ bool touchpadLayoutFor(const EvdevDevice& device, TouchpadLayout* layout, std::s
     for (uint16_t code : {kAbsMtPositionX, kAbsMtPositionY, kAbsMtSlot, kAbsMtTrackingId})
         if (!device.axis(code)) missing.push_back(eventCodeName(kEvAbs, code));
     if (!missing.empty()) {
-        const char* what = !hasX || !hasY ? "a single-touch device" : !hasSlot ? "a protocol-A multitouch device"
-                                                                                : "a multitouch device without contacts";
+        const char* what = !hasX && !hasY          ? "a single-touch device"
+                           : hasX && hasY && !hasSlot ? "a protocol-A multitouch device"
+                                                      : "an incomplete multitouch device";
         *error = std::string(what) + ": its description has no A: line for " + joined(missing) +
                  ", and the conversion needs multitouch slots with tracking IDs (protocol B)";
         return false;
