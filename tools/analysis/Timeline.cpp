@@ -119,6 +119,13 @@ void TimelineBuilder::addFrame(int64_t input, uint64_t timestamp) {
         haveFrame_ = true;
         timeline_.origin = Moment{input, timestamp, 0.0, true};
     }
+    // Settings since the last frame took effect before this one: they get its time.
+    for (size_t index : pendingSettings_) {
+        Episode& setting = timeline_.episodes[index];
+        const int64_t settingInput = setting.start.input;
+        setting.start = setting.end = moment(settingInput);
+    }
+    pendingSettings_.clear();
 }
 
 void TimelineBuilder::addSetting(int64_t input, const std::string& key, const PropertyValue& value, bool accepted) {
@@ -129,6 +136,7 @@ void TimelineBuilder::addSetting(int64_t input, const std::string& key, const Pr
     episode.value = value;
     episode.accepted = accepted;
     episode.finished = true;
+    pendingSettings_.push_back(timeline_.episodes.size() - 1);
 }
 
 void TimelineBuilder::addOtherRecord(int64_t) { ++timeline_.counts.inputs; }

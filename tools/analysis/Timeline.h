@@ -6,7 +6,7 @@
 //
 //   Timeline of demo.gestures (ms from the first frame, #N = input record N)
 //     time            inputs      gesture  what
-//                     #0          setting  TapToClickEnabled = true (accepted)
+//       0.0           #0          setting  TapToClickEnabled = true (accepted)
 //      48.0 - 296.0   #7 - #38    pointer  moved x +41.91 y -0.64 (31 events)
 //     600.0           #80         tap      one finger: press 0x1 dispatched, release returned
 //   Counts: 1 pointer, 1 tap, 1 setting
@@ -48,7 +48,7 @@ struct Moment {
     int64_t input = -1;      // -1: none
     uint64_t timestamp = 0;  // the frame's timestamp in ticks (0 before the first frame)
     double ms = 0.0;         // milliseconds from the timeline's origin
-    bool hasTime = false;    // false for a record before the first frame
+    bool hasTime = false;    // false when no frame came before or after it
 };
 
 // Consecutive events of one phase: "changed ×12".
@@ -117,7 +117,8 @@ public:
 
     // An event record, before the filter sees it (its timestamp is the frame's time).
     void addFrame(int64_t input, uint64_t timestamp);
-    // A setProperty record and the filter's answer.
+    // A setProperty record and the filter's answer. It takes the time of the next frame
+    // (the last frame's when none follows).
     void addSetting(int64_t input, const std::string& key, const PropertyValue& value, bool accepted);
     // Any other record (a client announcement): counted only.
     void addOtherRecord(int64_t input);
@@ -143,6 +144,7 @@ private:
     Timeline timeline_;
     Open open_;
     uint64_t frameTimestamp_ = 0;
+    std::vector<size_t> pendingSettings_;  // settings waiting for the next frame's time
     bool haveFrame_ = false;
     int64_t tapInput_ = -1;  // the input whose press was dispatched
     int tapEpisode_ = -1;

@@ -23,6 +23,9 @@ constexpr int64_t kScanTimeUsage = 86;
 constexpr int64_t kScanTimeLength = 2;
 constexpr double kScanTimeUnit_ns = 100'000.0;
 
+// The client that sets the script's properties.
+constexpr uint64_t kSettingsClientID = 1;
+
 constexpr int64_t kFingerTransducer = kHIDDigitizerTransducerTypeFinger;
 constexpr int64_t kPalmTransducer = kHIDDigitizerTransducerTypePalm;
 
@@ -143,6 +146,16 @@ private:
     }
 
     void addSetting(const Statement& st) {
+        if (!clientAdded_) {
+            // Settings come from a client: the first one connects before it sets anything.
+            formats::InputRecord client;
+            client.kind = formats::InputRecord::Kind::Client;
+            client.line = st.line;
+            client.clientID = kSettingsClientID;
+            client.clientAdded = true;
+            out_->records.push_back(std::move(client));
+            clientAdded_ = true;
+        }
         formats::InputRecord record;
         record.kind = formats::InputRecord::Kind::SetProperty;
         record.line = st.line;
@@ -328,6 +341,7 @@ private:
     formats::FrameRecording* out_;
     std::string* error_;
     std::vector<Contact> contacts_;  // in index order
+    bool clientAdded_ = false;
     bool clickDown_ = false;
     bool lastClickDown_ = false;
     size_t clickLine_ = 0;

@@ -3,7 +3,8 @@
 // report for it: a frame every 1/rate seconds while a contact touches, a contact's lift
 // is reported or the click is held or changes; one digitizer parent per frame with one
 // child per contact (and, for a Bluetooth surface, the relative scan-time child last);
-// settings as setProperty records before the first frame at or after their time.
+// settings as setProperty records before the first frame at or after their time, from a
+// client (ID 1) whose connection is announced before the first of them.
 
 #include <cstdint>
 #include <string>
