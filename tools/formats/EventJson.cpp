@@ -159,7 +159,7 @@ const char* kindName(HIDFieldKind kind) {
 bool readField(HIDEvent& event, const std::string& key, const Json& value, std::string* error) {
     uint32_t selector;
     if (!parseSelector(key, &selector)) {
-        *error = "field key \"" + key + "\" is not a selector such as \"0xb0000\"";
+        *error = "field key " + jsonString(key) + " is not a selector such as \"0xb0000\"";
         return false;
     }
     const std::string where = "field \"" + key + "\"";
@@ -236,8 +236,8 @@ HIDEventRef readEvent(const Json& json, int depth, std::string* error) {
         const std::string& key = item.key();
         if (key != "type" && key != "timestamp" && key != "sender" && key != "phase" && key != "fields" &&
             key != "children") {
-            *error = "unknown key \"" + key +
-                     "\" in an event (it may have type, timestamp, sender, phase, fields, children)";
+            *error = "unknown key " + jsonString(key) +
+                     " in an event (it may have type, timestamp, sender, phase, fields, children)";
             return nullptr;
         }
     }

@@ -3,6 +3,8 @@
 #include <cstdint>
 #include <limits>
 
+#include "JsonText.h"
+
 namespace orvane::formats::detail {
 
 bool parseJson(std::string_view text, Json* out, std::string* error) {
@@ -91,7 +93,7 @@ bool convertPropertyValue(const Json& value, int depth, PropertyValue* out, std:
             PropertyValue converted;
             std::string inner;
             if (!convertPropertyValue(element, depth + 1, &converted, &inner)) {
-                *error = "\"" + key + "\": " + inner;
+                *error = jsonString(key) + ": " + inner;
                 return false;
             }
             dictionary.emplace(key, std::move(converted));
