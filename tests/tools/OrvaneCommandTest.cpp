@@ -73,12 +73,27 @@ TEST(OrvaneCommand, FramesReadsStandardInputForADash) {
     EXPECT_EQ(lines(r.out).size(), 1u);
 }
 
+// A client turns tap-to-click on; then one finger touches down, moves for 20 frames 8 ms
+// apart and lifts: 24 records, 22 of them frames.
+std::string oneFingerSession(const ScratchFolder& scratch) {
+    std::string content = kHeader + "\n{\"client\": {\"id\": 1, \"added\": true}}\n" +
+                          "{\"setProperty\": {\"key\": \"TapToClickEnabled\", \"value\": true}}\n";
+    for (int frame = 0; frame < 22; ++frame) {
+        const std::string t = std::to_string(1'000'000'000LL + 8'000'000LL * frame);
+        const std::string touch = frame < 21 ? "1" : "0";
+        content += "{\"type\": 11, \"timestamp\": " + t + ", \"fields\": {\"0xb0003\": 0}, \"children\": [{\"type\": 11, " +
+                   "\"timestamp\": " + t + ", \"fields\": {\"0xb0000\": " + std::to_string(0.2 + 0.02 * frame) +
+                   ", \"0xb0001\": 0.5, \"0xb0005\": 0, \"0xb0008\": " + touch + ", \"0xb0009\": " + touch + "}}]}\n";
+    }
+    return scratch.write("session.frames.jsonl", content);
+}
+
 TEST(OrvaneCommand, ReplayWritesTheEventAndLogStreams) {
     ScratchFolder scratch;
     const std::string events = scratch.file("demo.events.jsonl");
     const std::string log = scratch.file("demo.log.jsonl");
     const CommandResult r =
-        runOrvane({"replay", kDemoRecording, "--events-out", events, "--log-out", log}, {fakePlugIn()});
+        runOrvane({"replay", oneFingerSession(scratch), "--events-out", events, "--log-out", log}, {fakePlugIn()});
     ASSERT_EQ(r.exitCode, 0) << r.err;
     EXPECT_EQ(r.err, "");
 
