@@ -1,6 +1,8 @@
 // orvane: the project's command-line program.
 //   orvane frames INPUT --out FILE
 //   orvane replay [INPUT] [--events-out FILE] [--log-out FILE] [--verbose]
+//   orvane run [DEVICE] [--config FILE] [--gesture-socket PATH] [--print] [--wait] [--stats] ...
+//   orvane devices
 
 #include <exception>
 #include <iostream>
@@ -12,6 +14,7 @@
 #include "ReplayCommand.h"
 #include "tools/evemu/EvemuConversion.h"
 #include "tools/host/PlugInHost.h"
+#include "tools/live/LiveCommand.h"
 
 namespace {
 
@@ -106,6 +109,10 @@ int run(int argc, char** argv) {
         ->type_name("PATH");
     addEvemuOptions(replayCommand, replay.evemu);
 
+    orvane::live::RunOptions live;
+    CLI::App* runCommand = orvane::live::addRunCommand(app, live);
+    CLI::App* devicesCommand = orvane::live::addDevicesCommand(app);
+
     try {
         app.parse(argc, argv);
     } catch (const CLI::CallForHelp& e) {
@@ -121,6 +128,8 @@ int run(int argc, char** argv) {
 
     if (framesCommand->parsed()) return orvane::cli::runFrames(frames);
     if (replayCommand->parsed()) return orvane::cli::runReplay(replay);
+    if (runCommand->parsed()) return orvane::live::runLive(live);
+    if (devicesCommand->parsed()) return orvane::live::listDevices();
     return 2;
 }
 
