@@ -19,9 +19,15 @@ ORVANE_EXPORT bool _isInternalBuild(void);
 
 namespace orvane {
 
+// _isInternalBuild's answer, kept here after the first call.
+inline bool internalBuild() {
+    static const bool internal = _isInternalBuild();
+    return internal;
+}
+
 // Per-frame diagnostics run only on an internal build with the verbose handle at debug level.
 inline bool verboseDebugEnabled() {
-    return _isInternalBuild() && LoggingServiceFilterVerbose()->isEnabled(LogLevel::Debug);
+    return internalBuild() && LoggingServiceFilterVerbose()->isEnabled(LogLevel::Debug);
 }
 
 // Logs at debug level on the verbose handle when verboseDebugEnabled().

@@ -306,7 +306,13 @@ void HIDHandMotion::updateFastestFingerSpeed(const HIDPathStates& pathTable) {
     if (maxFingerSpeed_ < currentMax) maxFingerSpeed_ = currentMax;
 
     const double interval_ms = ticksToMilliseconds(pathTable.frameInterval());
-    const float a = static_cast<float>(std::pow(2.0, interval_ms / -kFingerSpeedHalfLife_ms));
+    // Worked out again only when the exponent changes, as frames mostly come at one interval.
+    const double exponent = interval_ms / -kFingerSpeedHalfLife_ms;
+    if (!(exponent == speedBlendExponent_)) {
+        speedBlendPower_ = std::pow(2.0, exponent);
+        speedBlendExponent_ = exponent;
+    }
+    const float a = static_cast<float>(speedBlendPower_);
     // Blends the running maximum with the current one, not with the previous average.
     averageMaxFingerSpeed_ = a * maxFingerSpeed_ + (1.0f - a) * currentMax;
 }
@@ -315,8 +321,12 @@ void HIDHandMotion::clipMotionToDominantAxes(double frameInterval) {
     // With a 0.03 ms time constant the weight is 1 for any ordinary frame interval, so the
     // smoothing passes the new value straight through; kept that way on purpose.
     const double interval_ms = ticksToMilliseconds(frameInterval);
-    const float w =
-        static_cast<float>(1.0 - std::exp(interval_ms / static_cast<double>(kVelocitySmoothingTimeConstant_ms)));
+    const double exponent = interval_ms / static_cast<double>(kVelocitySmoothingTimeConstant_ms);
+    if (!(exponent == smoothingExponent_)) {
+        smoothingPower_ = std::exp(exponent);
+        smoothingExponent_ = exponent;
+    }
+    const float w = static_cast<float>(1.0 - smoothingPower_);
 
     nondominantAxesRatio_ = 1.0f;
 

@@ -4,6 +4,7 @@
 // back into the path table.
 
 #include <cstdint>
+#include <limits>
 
 #include "common/HIDTypes.h"
 #include "motion/HIDFingerToPathMap.h"
@@ -106,6 +107,11 @@ private:
     HIDMotion motionDeltas_{};
     HIDMotion deltas_mm_s_{};
     HIDMotion velocity_mm_s_{};
+    // The last exponents of the speed blend and of the smoothing, and their powers.
+    double speedBlendExponent_ = std::numeric_limits<double>::quiet_NaN();
+    double speedBlendPower_ = 0.0;
+    double smoothingExponent_ = std::numeric_limits<double>::quiet_NaN();
+    double smoothingPower_ = 0.0;
 };
 
 }  // namespace orvane

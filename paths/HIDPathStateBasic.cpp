@@ -25,6 +25,12 @@ constexpr float kDivingPairMaxHorizontalGap_mm = 30.0f;
 HIDPathStateBasic::HIDPathStateBasic(float height, float width) {
     paths_.reserve(kNumPaths);
     for (int i = 0; i < kNumPaths; ++i) paths_.push_back(HIDParserPath::initWithHeight(height, width));
+    for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) paths_[slot]->linkToTable(slot, &looseSlots_);
+}
+
+HIDPathStateBasic::~HIDPathStateBasic() {
+    // Paths handed out by paths() may outlive the table.
+    for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) paths_[slot]->linkToTable(-1, nullptr);
 }
 
 bool HIDPathStateBasic::unpackContactFrame(const HIDEventRef& frame, double time) {
@@ -37,12 +43,13 @@ bool HIDPathStateBasic::unpackContactFrame(const HIDEventRef& frame, double time
 
 void HIDPathStateBasic::clearExistingPathLiftoffsAndMasks(const HIDEventRef& frame) {
     if (!frame) return;
+    // Clearing paths leaves the frame as it is, so its contact count is the same for every slot.
+    const bool noContacts = getNumberOfContacts(frame) == 0;
     for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) {
         HIDParserPath* path = paths_[slot].get();
-        // The count is asked anew for every slot.
-        if (getNumberOfContacts(frame) == 0) {
+        if (noContacts) {
             path->clear();
-        } else if (path->getCurrentContact().fingerTipSwitch == 0) {
+        } else if (path->currentContact().fingerTipSwitch == 0) {
             // A lift-off stays visible for exactly one frame and is wiped here, on the next.
             path->clear();
         }
@@ -81,8 +88,7 @@ HIDParserPath* HIDPathStateBasic::getParserPath(int slot) const {
     return paths_[static_cast<size_t>(slot)].get();
 }
 
-HIDParserPath* HIDPathStateBasic::getParserPathforPathID(int pathID) const {
-    // A cleared path has ID 0; it is never found.
+HIDParserPath* HIDPathStateBasic::findParserPathforPathIDBySearch(int pathID) const {
     if (pathID == 0) return nullptr;
     for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) {
         HIDParserPath* path = paths_[static_cast<size_t>(slot)].get();

@@ -19,6 +19,9 @@ public:
 
     // initWithHeight:width: — makes the 15 paths.
     HIDPathStateBasic(float height, float width);
+    ~HIDPathStateBasic() override;
+    HIDPathStateBasic(const HIDPathStateBasic&) = delete;
+    HIDPathStateBasic& operator=(const HIDPathStateBasic&) = delete;
 
     bool unpackContactFrame(const HIDEventRef& frame, double time);
     void clearExistingPathLiftoffsAndMasks(const HIDEventRef& frame);
@@ -27,7 +30,22 @@ public:
     // The path at a slot; nullptr outside the table.
     HIDParserPath* getParserPath(int slot) const;
     // The first path of slots 1..14 whose current contact has this ID; nullptr for none (and for 0).
-    HIDParserPath* getParserPathforPathID(int pathID) const;
+    HIDParserPath* getParserPathforPathID(int pathID) const {
+        // A cleared path has ID 0; it is never found.
+        if (pathID == 0) return nullptr;
+        // While the slots before this ID's own slot carry their own IDs or none, none of them
+        // has this one, and the first slot that does is the ID's own, when it does; while no
+        // slot carries another's ID, no other slot has it at all. The table only ever reads
+        // contacts into their own slots, so the search is for paths changed from outside.
+        if (pathID >= 1 && pathID < kNumPaths) {
+            HIDParserPath* own = paths_[static_cast<size_t>(pathID)].get();
+            if ((looseSlots_ & ((1u << pathID) - 1)) == 0 && own->currentContact().path_id == pathID) return own;
+        }
+        if (looseSlots_ == 0) return nullptr;
+        return findParserPathforPathIDBySearch(pathID);
+    }
+    // The same answer found by looking at every slot in turn.
+    HIDParserPath* findParserPathforPathIDBySearch(int pathID) const;
 
     int countFingersOnDivingButton();
     bool anyNewContact() const { return numNewContacts_ > 0; }
@@ -50,6 +68,9 @@ public:
 
 private:
     std::vector<std::shared_ptr<HIDParserPath>> paths_;
+    // Bit s is set while the contact of slot s may carry an ID other than s or 0 (the paths
+    // keep it up to date, see HIDParserPath::linkToTable).
+    uint32_t looseSlots_ = 0;
     int numNewContacts_ = 0;
     int numNonEdgeTouches_ = 0;
     int numTouches_ = 0;

@@ -65,6 +65,25 @@ float sortLengthOf(HIDPoint p) {
     return static_cast<float>(std::sqrt(x * x + y * y));
 }
 
+// Orders velocities by sortLengthOf, keeping the order of equal lengths. Any stable sort
+// gives the same order when no length is NaN, and an insertion sort needs no buffer from the
+// heap; with a NaN among them the order depends on the algorithm, so the library's is used.
+void stableSortByLength(HIDPoint* first, HIDPoint* last) {
+    const auto shorter = [](HIDPoint a, HIDPoint b) { return sortLengthOf(a) < sortLengthOf(b); };
+    for (const HIDPoint* p = first; p != last; ++p) {
+        if (std::isnan(sortLengthOf(*p))) {
+            std::stable_sort(first, last, shorter);
+            return;
+        }
+    }
+    for (HIDPoint* i = first + (first != last ? 1 : 0); i < last; ++i) {
+        const HIDPoint v = *i;
+        HIDPoint* j = i;
+        for (; j != first && shorter(v, *(j - 1)); --j) *j = *(j - 1);
+        *j = v;
+    }
+}
+
 }  // namespace
 
 void HIDPathStates::updateButtonState(const HIDEventRef& frame) {
@@ -234,9 +253,8 @@ void HIDPathStates::computePathAndFingerSpeedSymmetries(int pathID) {
 
     std::sort(speeds.begin(), speeds.begin() + numOthers, [](float a, float b) { return a > b; });
     // Slowest first and then reversed, so of equally fast fingers the higher path ID leads.
-    auto others = velocities.begin() + 1;
-    std::stable_sort(others, others + numOthers,
-                     [](HIDPoint a, HIDPoint b) { return sortLengthOf(a) < sortLengthOf(b); });
+    HIDPoint* others = velocities.data() + 1;
+    stableSortByLength(others, others + numOthers);
     std::reverse(others, others + numOthers);
     velocities[0] = desiredVelocity;
 
@@ -289,10 +307,18 @@ float HIDPathStates::computeSpeedSimilarity() const {
 void HIDPathStates::breakOutOfRestingThumbBasedOnSymmetry() {
     const bool restingHandScalesOrTurns = maxMotionDeltasResting_ == motionDeltasResting_.scale ||
                                           maxMotionDeltasResting_ == motionDeltasResting_.rotate;
+    // The similarity depends on no thumb-zone flag, so the loop changes it nowhere: it is
+    // worked out once, at the first tracked path.
+    bool similarityKnown = false;
+    float similarity = 0.0f;
     for (int id = kFirstPathID; id <= kLastPathID; ++id) {
         HIDParserPath* path = getParserPathforPathID(id);
         if (!path || path->isNoTrackingStage()) continue;
-        speedSimilarity_ = computeSpeedSimilarity();
+        if (!similarityKnown) {
+            similarity = computeSpeedSimilarity();
+            similarityKnown = true;
+        }
+        speedSimilarity_ = similarity;
         const float y = path->currentContact().position.y;
         const float symmetry = path->_2F_speed_symmetry();
 

@@ -37,6 +37,7 @@ void HIDParserPath::updateCurPrevContactsWith(const HIDEvent& contact, double ti
     // The finger ID is one more than the path ID, on purpose.
     currentContact_.path_id = index + 1;
     currentContact_.finger_id = index + 2;
+    link_.noteID(currentContact_.path_id);
 
     const float x = static_cast<float>(contact.doubleValueForField(kHIDEventFieldDigitizerX));
     const float y = static_cast<float>(contact.doubleValueForField(kHIDEventFieldDigitizerY));
@@ -59,37 +60,6 @@ void HIDParserPath::updateCurPrevContactsWith(const HIDEvent& contact, double ti
     setPeakDisplacement();
     updatePathStageTimestamps(time);
 }
-
-bool HIDParserPath::isTouching() const { return currentContact_.fingerTipSwitch != 0; }
-
-bool HIDParserPath::wasTouching() const { return previousContact_.fingerTipSwitch != 0; }
-
-bool HIDParserPath::isNoTrackingStage() const { return currentContact_.fingerTipSwitch == 0; }
-
-bool HIDParserPath::isNewContact() const {
-    return currentContact_.fingerTipSwitch == 1 && previousContact_.fingerTipSwitch == 0;
-}
-
-// True on the frame of touching down, despite its name.
-bool HIDParserPath::isLiftOffStage() const {
-    return currentContact_.fingerTipSwitch == 1 && previousContact_.fingerTipSwitch == 0;
-}
-
-// True on the frame after lifting, despite its name.
-bool HIDParserPath::isMakeStage() const {
-    return currentContact_.fingerTipSwitch == 0 && previousContact_.fingerTipSwitch == 1;
-}
-
-bool HIDParserPath::isFingerOrRestingContact() const { return currentContact_.fingerConfidence != 0; }
-
-bool HIDParserPath::wasFingerOrRestingContact() const { return previousContact_.fingerConfidence != 0; }
-
-bool HIDParserPath::isPalmContact() const { return currentContact_.fingerConfidence == 0; }
-
-bool HIDParserPath::isFingerContact() const { return !isRestingInThumbZone_ && isFingerOrRestingContact(); }
-
-// Reports the thumb-zone flag of the last frame, on purpose.
-bool HIDParserPath::wasResting() const { return wasRestingInThumbZone_; }
 
 bool HIDParserPath::isContactOnDivingButton() const {
     return currentContact_.position.y > surfaceDimensions_.y * 0.5;
@@ -209,7 +179,14 @@ void HIDParserPath::updateDampedVelocity(bool strongDamping) {
                          ? 0.0f
                          : static_cast<float>(currentContact_.device_timestamp - previousContact_.device_timestamp);
     const double dt_ms = ticksToMilliseconds(static_cast<double>(dt));
-    const float k = static_cast<float>(std::pow(2.0, -dt_ms / kDampingHalfLife_ms));
+    // Frames mostly come at one interval, so the power is worked out again only when the
+    // exponent changes (2 to the power of 0 and of -0 are both 1).
+    const double exponent = -dt_ms / kDampingHalfLife_ms;
+    if (!(exponent == dampingExponent_)) {
+        dampingPower_ = std::pow(2.0, exponent);
+        dampingExponent_ = exponent;
+    }
+    const float k = static_cast<float>(dampingPower_);
 
     dampedVelocity_.x = dampedVelocity_.x * k + currentContact_.velocity.x * (1 - k);
     dampedVelocity_.y = dampedVelocity_.y * k + currentContact_.velocity.y * (1 - k);
@@ -243,6 +220,7 @@ void HIDParserPath::clear() {
     // The flags, the engaged velocity and speed, the ellipse offset, the speed symmetry and the
     // stage times survive a clear on purpose.
     currentContact_ = HIDContact{};
+    link_.noteID(0);
     previousContact_ = HIDContact{};
     dampedVelocity_ = HIDPoint{0.0f, 0.0f};
     dampedSpeed_ = 0.0f;

@@ -2,6 +2,7 @@
 // One finger path: the track of one contact across frames, with its current and previous
 // contact, stage tests, stage times, the screen-UI position filter and velocity damping.
 
+#include <limits>
 #include <memory>
 
 #include "common/HIDTypes.h"
@@ -22,17 +23,20 @@ public:
 
     // Stage tests. isMakeStage and isLiftOffStage are deliberately reversed from their
     // plain reading: make is true on the frame of lifting, lift-off on touch-down.
-    bool isTouching() const;
-    bool wasTouching() const;
-    bool isNoTrackingStage() const;
-    bool isNewContact() const;
-    bool isLiftOffStage() const;
-    bool isMakeStage() const;
-    bool isFingerOrRestingContact() const;
-    bool wasFingerOrRestingContact() const;
-    bool isPalmContact() const;
-    bool isFingerContact() const;
-    bool wasResting() const;
+    bool isTouching() const { return currentContact_.fingerTipSwitch != 0; }
+    bool wasTouching() const { return previousContact_.fingerTipSwitch != 0; }
+    bool isNoTrackingStage() const { return currentContact_.fingerTipSwitch == 0; }
+    bool isNewContact() const { return currentContact_.fingerTipSwitch == 1 && previousContact_.fingerTipSwitch == 0; }
+    // True on the frame of touching down, despite its name.
+    bool isLiftOffStage() const { return currentContact_.fingerTipSwitch == 1 && previousContact_.fingerTipSwitch == 0; }
+    // True on the frame after lifting, despite its name.
+    bool isMakeStage() const { return currentContact_.fingerTipSwitch == 0 && previousContact_.fingerTipSwitch == 1; }
+    bool isFingerOrRestingContact() const { return currentContact_.fingerConfidence != 0; }
+    bool wasFingerOrRestingContact() const { return previousContact_.fingerConfidence != 0; }
+    bool isPalmContact() const { return currentContact_.fingerConfidence == 0; }
+    bool isFingerContact() const { return !isRestingInThumbZone_ && isFingerOrRestingContact(); }
+    // Reports the thumb-zone flag of the last frame, on purpose.
+    bool wasResting() const { return wasRestingInThumbZone_; }
     bool isContactOnDivingButton() const;
     bool isEdgeContact() const;
 
@@ -42,11 +46,28 @@ public:
     void setIsRestingInThumbZone(bool resting) { setRestingInThumbZone(resting); }
     void clearPathSpeedSymmetry();
 
-    HIDContact& getCurrentContact() { return currentContact_; }
+    // The contact to change in place; the path table stops trusting this path's ID (see
+    // linkToTable) until the contact is set again.
+    HIDContact& getCurrentContact() {
+        link_.markLoose();
+        return currentContact_;
+    }
     HIDContact& getPreviousContact() { return previousContact_; }
     const HIDContact& currentContact() const { return currentContact_; }
     const HIDContact& previousContact() const { return previousContact_; }
-    void setCurrentContact(const HIDContact& c) { currentContact_ = c; }
+    void setCurrentContact(const HIDContact& c) {
+        currentContact_ = c;
+        link_.noteID(currentContact_.path_id);
+    }
+
+    // A path table finds its paths by ID without searching while every path's contact carries
+    // its own slot's ID or none. Each path it owns reports here, as a bit of `looseSlots`,
+    // whether its contact may carry another ID. nullptr unlinks the path.
+    void linkToTable(int slot, uint32_t* looseSlots) {
+        link_.slot = slot;
+        link_.looseSlots = looseSlots;
+        link_.noteID(currentContact_.path_id);
+    }
     void setPreviousContact(const HIDContact& c) { previousContact_ = c; }
 
     void updatePathStageTimestamps(double time);
@@ -94,6 +115,29 @@ public:
     void setTimestamps(const HIDPathTimestamps& t) { timestamps_ = t; }
 
 private:
+    // The path's place in its table. A copy of a path belongs to no table; a path is never
+    // assigned over.
+    struct TableLink {
+        int slot = -1;
+        uint32_t* looseSlots = nullptr;
+        TableLink() = default;
+        TableLink(const TableLink&) {}
+        TableLink& operator=(const TableLink&) = delete;
+        void noteID(int32_t pathID) const {
+            if (!looseSlots) return;
+            const uint32_t bit = 1u << slot;
+            if (pathID == 0 || pathID == slot) {
+                *looseSlots &= ~bit;
+            } else {
+                *looseSlots |= bit;
+            }
+        }
+        void markLoose() const {
+            if (looseSlots) *looseSlots |= 1u << slot;
+        }
+    };
+
+    TableLink link_;
     HIDContact currentContact_{};
     HIDContact previousContact_{};
     bool isResting_ = false;
@@ -117,6 +161,9 @@ private:
     HIDPoint engagedVelocity_{};
     HIDPoint dampedVelocity_{};
     HIDPathTimestamps timestamps_{};
+    // The last damping exponent and its power of two.
+    double dampingExponent_ = std::numeric_limits<double>::quiet_NaN();
+    double dampingPower_ = 0.0;
 };
 
 }  // namespace orvane

@@ -4,68 +4,48 @@
 #include <cmath>
 #include <cstdio>
 
+#include "HIDEventPool.h"
+
 namespace orvane {
 
 namespace {
 
-bool knownKind(uint32_t selector, HIDFieldKind* kind) {
-    const uint32_t type = selector >> 16;
-    const uint32_t index = selector & 0xffff;
-    switch (type) {
-    case kHIDEventTypeVendorDefined:
-        if (index <= 3) { *kind = HIDFieldKind::Integer; return true; }
-        if (index == 4) { *kind = HIDFieldKind::Data; return true; }
-        return false;
-    case kHIDEventTypeButton:
-        if (index == 0 || index == 1 || index == 4) { *kind = HIDFieldKind::Integer; return true; }
-        return false;
-    case kHIDEventTypeKeyboard:
-        if (index <= 2) { *kind = HIDFieldKind::Integer; return true; }
-        return false;
-    case kHIDEventTypeRotation:
-    case kHIDEventTypeScroll:
-    case kHIDEventTypeScale:
-        if (index <= 2) { *kind = HIDFieldKind::Double; return true; }
-        return false;
-    case kHIDEventTypeDigitizer:
-        if (index <= 2) { *kind = HIDFieldKind::Double; return true; }
-        if ((index >= 3 && index <= 9) || index == 0x1b) { *kind = HIDFieldKind::Integer; return true; }
-        return false;
-    case kHIDEventTypePointer:
-        if (index <= 2) { *kind = HIDFieldKind::Double; return true; }
-        if (index == 3) { *kind = HIDFieldKind::Integer; return true; }
-        return false;
-    default: return false;
-    }
+const std::vector<uint8_t> kNoData;
+
+}  // namespace
+
+bool hidFieldIsKnown(uint32_t selector) {
+    // No kind is its own fallback for both of these unless the selector is known.
+    return hidFieldKind(selector, HIDFieldKind::Integer) == hidFieldKind(selector, HIDFieldKind::Double);
 }
 
-// Truncation toward zero that stays defined for NaN and out-of-range values.
-int64_t truncateToInteger(double v) {
+int64_t HIDEvent::truncateToInteger(double v) {
     if (std::isnan(v)) return 0;
     if (v >= 9.2233720368547758e18) return INT64_MAX;
     if (v <= -9.2233720368547758e18) return INT64_MIN;
     return static_cast<int64_t>(v);
 }
 
-const std::vector<uint8_t> kNoData;
-
-}  // namespace
-
-HIDFieldKind hidFieldKind(uint32_t selector, HIDFieldKind fallback) {
-    HIDFieldKind kind;
-    return knownKind(selector, &kind) ? kind : fallback;
-}
-
-bool hidFieldIsKnown(uint32_t selector) {
-    HIDFieldKind kind;
-    return knownKind(selector, &kind);
-}
-
 HIDEvent::HIDEvent(uint32_t type, uint64_t timestamp, uint32_t options)
     : type_(type), options_(options), timestamp_(timestamp) {}
 
 HIDEventRef HIDEvent::create(uint32_t type, uint64_t timestamp, uint32_t options) {
-    return std::make_shared<HIDEvent>(type, timestamp, options);
+    return HIDEventPool::make(type, timestamp, options);
+}
+
+void HIDEvent::resetForPool() noexcept {
+    senderID_ = 0;
+    phase_ = 0;
+    fields_.clear();
+    children_.clear();
+    if (fields_.capacity() > HIDEventPool::kKeepFields) {
+        std::vector<Field>().swap(fields_);
+        fields_.reserve(HIDEventPool::kInitialFields);
+    }
+    if (children_.capacity() > HIDEventPool::kKeepChildren) {
+        std::vector<HIDEventRef>().swap(children_);
+        children_.reserve(HIDEventPool::kInitialChildren);
+    }
 }
 
 HIDEventRef HIDEvent::pointerEvent(uint64_t timestamp, double x, double y, double z, uint32_t buttonMask,
@@ -106,70 +86,13 @@ HIDEventRef HIDEvent::createButtonEvent(uint64_t timestamp, uint32_t buttonMask,
     return e;
 }
 
-const HIDEvent::Field* HIDEvent::findField(uint32_t selector) const {
-    for (const Field& f : fields_) {
-        if (f.selector == selector) return &f;
-        if (f.selector > selector) break;
-    }
-    return nullptr;
-}
-
-HIDEvent::Field& HIDEvent::fieldForWriting(uint32_t selector, HIDFieldKind kind) {
-    auto it = std::lower_bound(fields_.begin(), fields_.end(), selector,
-                               [](const Field& f, uint32_t s) { return f.selector < s; });
-    if (it != fields_.end() && it->selector == selector) {
-        it->kind = kind;
-        return *it;
-    }
-    return *fields_.insert(it, Field{selector, kind, 0, 0.0, {}});
-}
-
-int64_t HIDEvent::integerValueForField(uint32_t selector) const {
-    const Field* f = findField(selector);
-    if (!f) return 0;
-    switch (f->kind) {
-    case HIDFieldKind::Integer: return f->integer;
-    case HIDFieldKind::Double: return truncateToInteger(f->real);
-    case HIDFieldKind::Data: return 0;
-    }
-    return 0;
-}
-
-double HIDEvent::doubleValueForField(uint32_t selector) const {
-    const Field* f = findField(selector);
-    if (!f) return 0.0;
-    switch (f->kind) {
-    case HIDFieldKind::Integer: return static_cast<double>(f->integer);
-    case HIDFieldKind::Double: return f->real;
-    case HIDFieldKind::Data: return 0.0;
-    }
-    return 0.0;
+HIDEvent::Field& HIDEvent::insertField(Field* before, uint32_t selector, HIDFieldKind kind) {
+    return *fields_.insert(fields_.begin() + (before - fields_.data()), Field{selector, kind, 0, 0.0, {}});
 }
 
 const std::vector<uint8_t>& HIDEvent::dataValueForField(uint32_t selector) const {
     const Field* f = findField(selector);
     return (f && f->kind == HIDFieldKind::Data) ? f->data : kNoData;
-}
-
-// A known field keeps its own kind whatever setter is used; an unknown one takes the setter's.
-void HIDEvent::setIntegerValue(int64_t value, uint32_t selector) {
-    switch (hidFieldKind(selector, HIDFieldKind::Integer)) {
-    case HIDFieldKind::Integer: fieldForWriting(selector, HIDFieldKind::Integer).integer = value; break;
-    case HIDFieldKind::Double:
-        fieldForWriting(selector, HIDFieldKind::Double).real = static_cast<double>(value);
-        break;
-    case HIDFieldKind::Data: break;
-    }
-}
-
-void HIDEvent::setDoubleValue(double value, uint32_t selector) {
-    switch (hidFieldKind(selector, HIDFieldKind::Double)) {
-    case HIDFieldKind::Double: fieldForWriting(selector, HIDFieldKind::Double).real = value; break;
-    case HIDFieldKind::Integer:
-        fieldForWriting(selector, HIDFieldKind::Integer).integer = truncateToInteger(value);
-        break;
-    case HIDFieldKind::Data: break;
-    }
 }
 
 void HIDEvent::setDataValue(const uint8_t* bytes, size_t length, uint32_t selector) {
@@ -187,7 +110,7 @@ void HIDEvent::removeEvent(const HIDEventRef& child) {
 }
 
 HIDEventRef HIDEvent::copy() const {
-    auto e = std::make_shared<HIDEvent>(type_, timestamp_, options_);
+    HIDEventRef e = HIDEventPool::make(type_, timestamp_, options_);
     e->senderID_ = senderID_;
     e->phase_ = phase_;
     e->fields_ = fields_;

@@ -1,6 +1,8 @@
 #pragma once
 // The platform's HID event: a type, a timestamp in ticks, a sender ID, a phase,
 // options, fields addressed by selector (type << 16 | index) and ordered children.
+// Events made by the creation calls and by copy() come from HIDEventPool and go back to it
+// when their last strong reference goes.
 
 #include <cstdint>
 #include <memory>
@@ -81,9 +83,29 @@ enum : uint32_t {
 enum class HIDFieldKind : uint8_t { Integer, Double, Data };
 
 // The kind of a field known to the platform, or `fallback` for any other selector.
-HIDFieldKind hidFieldKind(uint32_t selector, HIDFieldKind fallback);
+constexpr HIDFieldKind hidFieldKind(uint32_t selector, HIDFieldKind fallback) {
+    const uint32_t index = selector & 0xffff;
+    switch (selector >> 16) {
+    case kHIDEventTypeVendorDefined:
+        return index <= 3 ? HIDFieldKind::Integer : index == 4 ? HIDFieldKind::Data : fallback;
+    case kHIDEventTypeButton:
+        return (index == 0 || index == 1 || index == 4) ? HIDFieldKind::Integer : fallback;
+    case kHIDEventTypeKeyboard: return index <= 2 ? HIDFieldKind::Integer : fallback;
+    case kHIDEventTypeRotation:
+    case kHIDEventTypeScroll:
+    case kHIDEventTypeScale: return index <= 2 ? HIDFieldKind::Double : fallback;
+    case kHIDEventTypeDigitizer:
+        if (index <= 2) return HIDFieldKind::Double;
+        return ((index >= 3 && index <= 9) || index == 0x1b) ? HIDFieldKind::Integer : fallback;
+    case kHIDEventTypePointer:
+        return index <= 2 ? HIDFieldKind::Double : index == 3 ? HIDFieldKind::Integer : fallback;
+    default: return fallback;
+    }
+}
 // True when the selector is one of the platform's known fields.
 bool hidFieldIsKnown(uint32_t selector);
+
+class HIDEventPool;
 
 class HIDEvent {
 public:
@@ -119,11 +141,46 @@ public:
     bool conformsToEventType(uint32_t type) const { return type_ == type; }
 
     // Fields. A field that was never set reads as 0, 0.0 or empty data.
-    int64_t integerValueForField(uint32_t selector) const;
-    double doubleValueForField(uint32_t selector) const;
+    int64_t integerValueForField(uint32_t selector) const {
+        const Field* f = findField(selector);
+        if (!f) return 0;
+        switch (f->kind) {
+        case HIDFieldKind::Integer: return f->integer;
+        case HIDFieldKind::Double: return truncateToInteger(f->real);
+        case HIDFieldKind::Data: return 0;
+        }
+        return 0;
+    }
+    double doubleValueForField(uint32_t selector) const {
+        const Field* f = findField(selector);
+        if (!f) return 0.0;
+        switch (f->kind) {
+        case HIDFieldKind::Integer: return static_cast<double>(f->integer);
+        case HIDFieldKind::Double: return f->real;
+        case HIDFieldKind::Data: return 0.0;
+        }
+        return 0.0;
+    }
     const std::vector<uint8_t>& dataValueForField(uint32_t selector) const;
-    void setIntegerValue(int64_t value, uint32_t selector);
-    void setDoubleValue(double value, uint32_t selector);
+    // A known field keeps its own kind whatever setter is used; an unknown one takes the setter's.
+    void setIntegerValue(int64_t value, uint32_t selector) {
+        switch (hidFieldKind(selector, HIDFieldKind::Integer)) {
+        case HIDFieldKind::Integer: fieldForWriting(selector, HIDFieldKind::Integer).integer = value; break;
+        case HIDFieldKind::Double:
+            fieldForWriting(selector, HIDFieldKind::Double).real = static_cast<double>(value);
+            break;
+        case HIDFieldKind::Data: break;
+        }
+    }
+    void setDoubleValue(double value, uint32_t selector) {
+        switch (hidFieldKind(selector, HIDFieldKind::Double)) {
+        case HIDFieldKind::Double: fieldForWriting(selector, HIDFieldKind::Double).real = value; break;
+        case HIDFieldKind::Integer:
+            fieldForWriting(selector, HIDFieldKind::Integer).integer = truncateToInteger(value);
+            break;
+        case HIDFieldKind::Data: break;
+        }
+    }
     void setDataValue(const uint8_t* bytes, size_t length, uint32_t selector);
     bool hasField(uint32_t selector) const { return findField(selector) != nullptr; }
     // Every field that was set, in ascending selector order.
@@ -142,9 +199,34 @@ public:
     std::string description() const;
 
 private:
-    const Field* findField(uint32_t selector) const;
-    Field& fieldForWriting(uint32_t selector, HIDFieldKind kind);
+    friend class HIDEventPool;
 
+    // Fields are kept in ascending selector order; there are only ever a few.
+    const Field* findField(uint32_t selector) const {
+        for (const Field& f : fields_) {
+            if (f.selector >= selector) return f.selector == selector ? &f : nullptr;
+        }
+        return nullptr;
+    }
+    // The field to write, made (with the given kind) where it is missing.
+    Field& fieldForWriting(uint32_t selector, HIDFieldKind kind) {
+        for (Field& f : fields_) {
+            if (f.selector == selector) {
+                f.kind = kind;
+                return f;
+            }
+            if (f.selector > selector) return insertField(&f, selector, kind);
+        }
+        fields_.push_back(Field{selector, kind, 0, 0.0, {}});
+        return fields_.back();
+    }
+    Field& insertField(Field* before, uint32_t selector, HIDFieldKind kind);
+    // Truncation toward zero that stays defined for NaN and out-of-range values.
+    static int64_t truncateToInteger(double v);
+    // Back to the state of a new event, keeping the storage (pool use only).
+    void resetForPool() noexcept;
+
+    HIDEvent* poolNext_ = nullptr;
     uint32_t type_;
     uint32_t options_;
     uint64_t timestamp_;

@@ -1,6 +1,8 @@
 #include "PerfFrames.h"
 
 #include <algorithm>
+#include <array>
+#include <span>
 #include <cmath>
 
 namespace orvane::perf {
@@ -38,7 +40,7 @@ HIDEventRef contactEvent(uint64_t t, const Contact& c, bool first) {
     return e;
 }
 
-HIDEventRef frameEvent(uint64_t t, const std::vector<Contact>& contacts, bool first) {
+HIDEventRef frameEvent(uint64_t t, std::span<const Contact> contacts, bool first) {
     HIDEventRef frame = HIDEvent::create(kHIDEventTypeDigitizer, t);
     frame->setIntegerValue(0, kHIDEventFieldDigitizerButtonMask);
     frame->setIntegerValue(first ? kHIDDigitizerEventRange | kHIDDigitizerEventTouch | kHIDDigitizerEventPosition
@@ -64,28 +66,31 @@ public:
         }
         const uint64_t k = frame_++;
         const uint64_t t = kStart_ns + k * kFrameInterval_ns;
-        std::vector<Contact> contacts;
+        // At most three contacts, kept off the heap so that making a frame allocates nothing
+        // once the event pool is warm.
+        std::array<Contact, 3> contacts{};
+        size_t n = 0;
         if (name_ == "one-finger") {
             // Three degrees a frame: about 1.5 surface units.
             const double a = static_cast<double>(k % 120) * (3.0 * 3.14159265358979 / 180.0);
-            contacts.push_back({0, 0.5 + 0.3 * std::cos(a), 0.5 + 0.3 * std::sin(a)});
+            contacts[n++] = Contact{0, 0.5 + 0.3 * std::cos(a), 0.5 + 0.3 * std::sin(a)};
         } else if (name_ == "two-finger-scroll") {
             // About 0.7 surface units a frame, enough to move the scroll every frame.
             const double y = 0.25 + 0.5 * triangle(k, 72);
-            contacts.push_back({1, 0.4, y});
-            contacts.push_back({2, 0.6, y + 0.01});
+            contacts[n++] = Contact{1, 0.4, y};
+            contacts[n++] = Contact{2, 0.6, y + 0.01};
         } else if (name_ == "pinch") {
             const double half = 0.05 + 0.15 * triangle(k, 60);
-            contacts.push_back({1, 0.5 - half, 0.5 - half * 0.5});
-            contacts.push_back({2, 0.5 + half, 0.5 + half * 0.5});
+            contacts[n++] = Contact{1, 0.5 - half, 0.5 - half * 0.5};
+            contacts[n++] = Contact{2, 0.5 + half, 0.5 + half * 0.5};
         } else {
             const double x = 0.2 + 0.3 * triangle(k, 100);
-            contacts.push_back({1, x, 0.6});
-            contacts.push_back({2, x + 0.15, 0.65});
-            contacts.push_back({3, x + 0.3, 0.6});
+            contacts[n++] = Contact{1, x, 0.6};
+            contacts[n++] = Contact{2, x + 0.15, 0.65};
+            contacts[n++] = Contact{3, x + 0.3, 0.6};
         }
         Record r;
-        r.event = frameEvent(t, contacts, k == 0);
+        r.event = frameEvent(t, std::span<const Contact>(contacts.data(), n), k == 0);
         return r;
     }
     const formats::ServiceDescription& service() const override { return service_; }

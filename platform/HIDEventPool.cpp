@@ -1,0 +1,135 @@
+#include "HIDEventPool.h"
+
+#include <atomic>
+#include <new>
+#include <thread>
+
+#include "HIDEvent.h"
+
+namespace orvane {
+
+namespace {
+
+// A block on the idle list.
+struct IdleBlock {
+    IdleBlock* next;
+};
+static_assert(HIDEventPool::kBlockSize >= sizeof(IdleBlock));
+
+class SpinLock {
+public:
+    void lock() noexcept {
+        while (flag_.test_and_set(std::memory_order_acquire)) {
+            while (flag_.test(std::memory_order_relaxed)) std::this_thread::yield();
+        }
+    }
+    void unlock() noexcept { flag_.clear(std::memory_order_release); }
+
+private:
+    std::atomic_flag flag_ = ATOMIC_FLAG_INIT;
+};
+
+struct PoolState {
+    SpinLock lock;
+    HIDEvent* idleEvents = nullptr;
+    IdleBlock* idleBlocks = nullptr;
+    size_t created = 0;
+    size_t idle = 0;
+    size_t blocksCreated = 0;
+    size_t blocksIdle = 0;
+};
+
+// Never destroyed: events may be released by other objects' destructors at exit.
+PoolState& state() {
+    static PoolState* s = new PoolState;
+    return *s;
+}
+
+struct Guard {
+    explicit Guard(SpinLock& l) : lock(l) { lock.lock(); }
+    ~Guard() { lock.unlock(); }
+    SpinLock& lock;
+};
+
+struct Recycler {
+    void operator()(HIDEvent* event) const noexcept { HIDEventPool::recycle(event); }
+};
+
+}  // namespace
+
+void* HIDEventPool::allocateBlock(size_t size) {
+    if (size <= kBlockSize) {
+        PoolState& s = state();
+        Guard guard(s.lock);
+        if (IdleBlock* block = s.idleBlocks) {
+            s.idleBlocks = block->next;
+            --s.blocksIdle;
+            return block;
+        }
+        ++s.blocksCreated;
+    }
+    return ::operator new(size <= kBlockSize ? kBlockSize : size);
+}
+
+void HIDEventPool::deallocateBlock(void* block, size_t size) noexcept {
+    if (size > kBlockSize) {
+        ::operator delete(block);
+        return;
+    }
+    PoolState& s = state();
+    Guard guard(s.lock);
+    auto* idle = static_cast<IdleBlock*>(block);
+    idle->next = s.idleBlocks;
+    s.idleBlocks = idle;
+    ++s.blocksIdle;
+}
+
+void HIDEventPool::recycle(HIDEvent* event) noexcept {
+    // Releasing the children may recycle them in turn, so it happens outside the lock.
+    event->resetForPool();
+    PoolState& s = state();
+    {
+        Guard guard(s.lock);
+        if (s.idle < kMaxIdleEvents) {
+            event->poolNext_ = s.idleEvents;
+            s.idleEvents = event;
+            ++s.idle;
+            return;
+        }
+        --s.created;
+    }
+    delete event;
+}
+
+std::shared_ptr<HIDEvent> HIDEventPool::make(uint32_t type, uint64_t timestamp, uint32_t options) {
+    PoolState& s = state();
+    HIDEvent* event = nullptr;
+    {
+        Guard guard(s.lock);
+        if ((event = s.idleEvents) != nullptr) {
+            s.idleEvents = event->poolNext_;
+            --s.idle;
+        } else {
+            ++s.created;
+        }
+    }
+    if (event) {
+        event->poolNext_ = nullptr;
+        event->type_ = type;
+        event->options_ = options;
+        event->timestamp_ = timestamp;
+    } else {
+        event = new HIDEvent(type, timestamp, options);
+        event->fields_.reserve(kInitialFields);
+        event->children_.reserve(kInitialChildren);
+    }
+    return std::shared_ptr<HIDEvent>(event, Recycler{}, HIDEventBlockAllocator<HIDEvent>{});
+}
+
+HIDEventPool::Statistics HIDEventPool::statistics() {
+    PoolState& s = state();
+    Guard guard(s.lock);
+    return Statistics{s.created, s.idle, s.blocksCreated, s.blocksIdle};
+}
+
+}  // namespace orvane

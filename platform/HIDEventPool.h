@@ -1,0 +1,64 @@
+#pragma once
+// Where the platform's events come from: a pool of event objects and of the reference-count
+// blocks that share them. An event goes back to the pool when its last strong reference
+// goes, with its field and child storage kept, so that once a steady stream of frames has
+// been seen, making and dropping events takes nothing from the heap. Ordinary shared
+// ownership throughout: the same event may be held, dispatched, returned and made a child
+// of another, and weak references see it expire as usual.
+//
+// Safe to use from any thread; the lists are guarded by a spin lock held for a few
+// instructions only. The pool lives for the whole process (it is never destroyed, so events
+// released during exit are still taken back).
+
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+
+namespace orvane {
+
+class HIDEvent;
+
+class HIDEventPool {
+public:
+    // A reset event of this type, timestamp and options, from the pool or new.
+    static std::shared_ptr<HIDEvent> make(uint32_t type, uint64_t timestamp, uint32_t options);
+
+    struct Statistics {
+        size_t created = 0;      // event objects ever made
+        size_t idle = 0;         // event objects waiting in the pool
+        size_t blocksCreated = 0;  // reference-count blocks ever made
+        size_t blocksIdle = 0;     // reference-count blocks waiting in the pool
+    };
+    static Statistics statistics();
+
+    // Room kept in a new event for this many fields and children; more grows the storage,
+    // which the event keeps while it is pooled unless it grew beyond the keep limits.
+    static constexpr size_t kInitialFields = 12;
+    static constexpr size_t kInitialChildren = 6;
+    static constexpr size_t kKeepFields = 64;
+    static constexpr size_t kKeepChildren = 64;
+    // At most this many idle events are kept; more are freed.
+    static constexpr size_t kMaxIdleEvents = 4096;
+
+    // The size of a reference-count block the pool keeps; larger requests go to the heap.
+    static constexpr size_t kBlockSize = 64;
+    static void* allocateBlock(size_t size);
+    static void deallocateBlock(void* block, size_t size) noexcept;
+    // Takes back an event whose last strong reference went.
+    static void recycle(HIDEvent* event) noexcept;
+};
+
+// The allocator of the reference-count blocks of pooled events.
+template <typename T>
+struct HIDEventBlockAllocator {
+    using value_type = T;
+    HIDEventBlockAllocator() = default;
+    template <typename U>
+    HIDEventBlockAllocator(const HIDEventBlockAllocator<U>&) noexcept {}
+    T* allocate(size_t n) { return static_cast<T*>(HIDEventPool::allocateBlock(n * sizeof(T))); }
+    void deallocate(T* p, size_t n) noexcept { HIDEventPool::deallocateBlock(p, n * sizeof(T)); }
+    template <typename U>
+    bool operator==(const HIDEventBlockAllocator<U>&) const noexcept { return true; }
+};
+
+}  // namespace orvane
