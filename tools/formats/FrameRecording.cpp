@@ -2,6 +2,7 @@
 
 #include <cerrno>
 #include <cstring>
+#include <filesystem>
 #include <fstream>
 #include <limits>
 #include <ostream>
@@ -301,6 +302,12 @@ bool readFrameRecording(std::string_view content, const std::string& name, Frame
 
 bool readFileContent(const std::string& path, std::string* content, std::string* error) {
     try {
+        // A folder opens as a stream that reads nothing; say what it is instead.
+        std::error_code ec;
+        if (std::filesystem::is_directory(path, ec)) {
+            *error = path + ": cannot be read (" + std::strerror(EISDIR) + ")";
+            return false;
+        }
         std::ifstream file(path, std::ios::binary);
         if (!file) {
             *error = path + ": cannot be read (" + std::strerror(errno) + ")";
