@@ -35,6 +35,7 @@
 #include "bench/support/AllocationCounter.h"
 #include "bench/support/PerfDriver.h"
 #include "bench/support/PerfFrames.h"
+#include "platform/Logging.h"
 
 #ifndef ORVANE_DEMO_RECORDING
 #define ORVANE_DEMO_RECORDING "data/demo.frames.jsonl"
@@ -44,6 +45,13 @@ using namespace orvane;
 using namespace orvane::perf;
 
 namespace {
+
+// The filter's log lines are formatted as usual and then dropped, so that the figures do
+// not depend on a terminal.
+class DroppingLogSink : public LogSink {
+public:
+    void write(const LogRecord&) override {}
+};
 
 // Frames passed before anything is measured, so that the hand is in its steady state and
 // every pool has grown to what the hand needs.
@@ -204,6 +212,7 @@ int soakMode(const std::string& name, long frames) {
 }  // namespace
 
 int main(int argc, char** argv) {
+    Logging::setSink(std::make_shared<DroppingLogSink>());
     if (argc == 4 && (std::strcmp(argv[1], "--count") == 0 || std::strcmp(argv[1], "--soak") == 0)) {
         const long frames = std::strtol(argv[3], nullptr, 10);
         if (frames <= 0) {
