@@ -12,8 +12,13 @@
 //     so no pointer can start in the first 70 ms.
 // Both alps recordings start at 0.000000 and are over by 225 ms.
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
+#include <pty.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
+#include <cerrno>
 #include <nlohmann/json.hpp>
 #include <string>
 #include <vector>
@@ -334,6 +339,90 @@ TEST(EvemuCommand, StandardInputTakesARecordingWithItsDescription) {
                                          {}, readFile(kData + "/buttons.two-presses.events"));
     EXPECT_EQ(bare.exitCode, 0) << bare.err;
     EXPECT_EQ(lines(bare.out).size(), 12u);  // the header, five frames and six button events
+}
+
+// A recording of `frames` frames: one finger moving right across the clickpad.
+std::string longRecording(const ScratchFolder& scratch, int frames, const std::string& name = "long.evemu") {
+    std::string text = readFile(kData + "/clickpad.evemu");
+    text.resize(text.find("################################"));  // its description only
+    char line[96];
+    std::snprintf(line, sizeof line, "E: 5.000000 0003 0039 0001\n");
+    text += line;
+    for (int i = 0; i < frames; ++i) {
+        const int us = 5000000 + i * 8000;
+        std::snprintf(line, sizeof line, "E: %d.%06d 0003 0035 %04d\nE: %d.%06d 0000 0000 0000\n", us / 1000000,
+                      us % 1000000, i % 1000, us / 1000000, us % 1000000);
+        text += line;
+    }
+    return scratch.write(name, text);
+}
+
+// Runs orvane with standard error on a terminal (standard output to a file) and returns
+// everything the terminal showed.
+std::string runOnATerminal(const std::vector<std::string>& args, int* exitCode) {
+    int master = -1;
+    const pid_t child = ::forkpty(&master, nullptr, nullptr, nullptr);
+    if (child == 0) {
+        const int null = ::open("/dev/null", O_WRONLY);
+        ::dup2(null, STDOUT_FILENO);
+        std::vector<char*> argv;
+        argv.push_back(const_cast<char*>(kOrvaneCommand));
+        for (const std::string& a : args) argv.push_back(const_cast<char*>(a.c_str()));
+        argv.push_back(nullptr);
+        ::execv(kOrvaneCommand, argv.data());
+        ::_exit(127);
+    }
+    std::string shown;
+    char buffer[4096];
+    for (;;) {
+        const ssize_t n = ::read(master, buffer, sizeof buffer);
+        if (n > 0) shown.append(buffer, size_t(n));
+        else if (n < 0 && errno == EINTR) continue;
+        else break;  // EIO once the child has gone
+    }
+    int status = 0;
+    ::waitpid(child, &status, 0);
+    ::close(master);
+    *exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+    return shown;
+}
+
+TEST(EvemuCommand, LongReplaysShowProgressOnATerminal) {
+    ScratchFolder scratch;
+    const std::string input = longRecording(scratch, 1500);  // 1500 records, above the 1000 that count as long
+    int exitCode = -1;
+    const std::string shown = runOnATerminal({"replay", input, "--keyboard-cover"}, &exitCode);
+    EXPECT_EQ(exitCode, 0) << shown;
+    // One line redrawn in place (a carriage return, then the line wiped), at 0 % and ending
+    // at 99 % (1499 of 1500 done when the last record starts), then wiped.
+    EXPECT_NE(shown.find("\r\033[Korvane: replaying " + input + ": 0 / 1500 records (0%)"), std::string::npos)
+        << shown;
+    EXPECT_NE(shown.find("orvane: replaying " + input + ": 1485 / 1500 records (99%)"), std::string::npos);
+    EXPECT_EQ(shown.find("(100%)"), std::string::npos);
+    EXPECT_EQ(shown.find('\n'), std::string::npos);  // never a new line
+    ASSERT_GE(shown.size(), 4u);
+    EXPECT_EQ(shown.substr(shown.size() - 4), "\r\033[K");
+    // Once per percent: 100 redraws.
+    size_t redraws = 0;
+    for (size_t at = shown.find("records ("); at != std::string::npos; at = shown.find("records (", at + 1)) ++redraws;
+    EXPECT_EQ(redraws, 100u);
+}
+
+TEST(EvemuCommand, NoProgressWhenNotATerminalOrForShortInputs) {
+    ScratchFolder scratch;
+    const std::string input = longRecording(scratch, 1500);
+    const CommandResult piped = runOrvane({"replay", input, "--keyboard-cover"});
+    EXPECT_EQ(piped.exitCode, 0) << piped.err;
+    EXPECT_EQ(piped.err, "");
+    int exitCode = -1;
+    const std::string shortRun =
+        runOnATerminal({"replay", longRecording(scratch, 998, "short.evemu"), "--keyboard-cover"}, &exitCode);
+    EXPECT_EQ(exitCode, 0);
+    EXPECT_EQ(shortRun, "");  // 998 records
+    // Nor while a stream goes to the same terminal's standard output.
+    const std::string streamed = runOnATerminal({"replay", input, "--keyboard-cover", "--events-out", "-"}, &exitCode);
+    EXPECT_EQ(exitCode, 0);
+    EXPECT_EQ(streamed.find("records ("), std::string::npos);
 }
 
 }  // namespace

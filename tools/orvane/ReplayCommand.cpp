@@ -10,6 +10,7 @@
 
 #include "InputLoader.h"
 #include "OutputFile.h"
+#include "ProgressLine.h"
 #include "platform/DeviceInformation.h"
 #include "platform/HIDEventDispatcher.h"
 #include "platform/HIDEventService.h"
@@ -20,6 +21,7 @@
 #include "tools/formats/EventStreamWriter.h"
 #include "tools/formats/LogStreamSink.h"
 #include "tools/host/PlugInHost.h"
+#include "tools/html/ReplayPage.h"
 
 #ifndef ORVANE_DEMO_RECORDING
 #define ORVANE_DEMO_RECORDING "data/demo.frames.jsonl"
@@ -137,6 +139,8 @@ int runReplay(const ReplayOptions& options) {
     }
     if (!options.eventsOut.empty() && options.eventsOut == options.logOut)
         return fail("orvane: --events-out and --log-out must name different outputs");
+    if (!options.html.empty() && (options.html == options.eventsOut || options.html == options.logOut))
+        return fail("orvane: --html must name an output of its own, not that of --events-out or --log-out");
 
     std::string error;
     const std::string inputPath = options.input.empty() ? demoRecordingPath() : options.input;
@@ -151,9 +155,14 @@ int runReplay(const ReplayOptions& options) {
             return fail(located(recording, recording.headerLine, "the timebase can no longer be set"));
     }
 
-    OutputFile eventsFile, logFile;
+    OutputFile eventsFile, logFile, htmlFile;
     if (!options.eventsOut.empty() && !eventsFile.open(options.eventsOut, &error)) return fail(error);
     if (!options.logOut.empty() && !logFile.open(options.logOut, &error)) return fail(error);
+    if (!options.html.empty() && !htmlFile.open(options.html, &error)) return fail(error);
+    std::unique_ptr<html::ReplayPage> page;
+    if (htmlFile.isOpen())
+        page = std::make_unique<html::ReplayPage>(recording.name, recording.header.service.properties,
+                                                  recording.header.timebase);
 
     std::unique_ptr<formats::EventStreamWriter> events;
     if (eventsFile.isOpen()) {
@@ -176,6 +185,7 @@ int runReplay(const ReplayOptions& options) {
         ++tally.dispatched;
         tally.countTypes(*event);
         timeline.addDispatched(input, *event);
+        if (page) page->addDispatched(input, *event);
         // Written now: the filter may change the event once it has been sent.
         if (events) events->writeDispatched(input, *event);
     });
@@ -198,15 +208,22 @@ int runReplay(const ReplayOptions& options) {
 
     std::map<uint64_t, HIDConnectionRef> clients;
     std::vector<HIDConnectionRef> connected;  // in order of arrival; setProperty comes from the last
+    // No progress line while the filter's log lines or a stream go to the terminal too.
+    ProgressLine progress("replaying " + recording.name, recording.records.size(),
+                          !echo && !eventsFile.isStandardOutput() && !logFile.isStandardOutput() &&
+                              !htmlFile.isStandardOutput());
     for (size_t n = 0; n < recording.records.size(); ++n) {
         const formats::InputRecord& record = recording.records[n];
         input = static_cast<int64_t>(n);
+        progress.update(n);
         logSink->setInput(input);
         switch (record.kind) {
         case formats::InputRecord::Kind::Event: {
             ++tally.events;
             HIDEventRef result;
             timeline.addFrame(input, record.event->timestamp());
+            // Before the filter sees it: the filter changes the frame it is given.
+            if (page) page->addFrame(input, *record.event);
             if (!host.filterEvent(record.event, &result, &error)) return fail(located(recording, record.line, error));
             if (result) {
                 ++tally.returned;
@@ -215,6 +232,7 @@ int runReplay(const ReplayOptions& options) {
                 ++tally.returnedNone;
             }
             timeline.addReturned(input, result.get());
+            if (page) page->addReturned(input, result.get());
             if (events) events->writeReturned(input, result.get());
             break;
         }
@@ -243,17 +261,22 @@ int runReplay(const ReplayOptions& options) {
         }
     }
 
+    progress.finish();
+
     if (!host.cancel(&error)) return fail("orvane: " + error);
     host.unload();
     const auto logCounts = logSink->counts();
     Logging::setSink(std::make_shared<StandardErrorLogSink>());
 
-    if (!eventsFile.commit(&error) || !logFile.commit(&error)) return fail(error);
+    const analysis::Timeline finished = timeline.finish();
+    if (page) page->write(htmlFile.stream(), finished);
+    if (!eventsFile.commit(&error) || !logFile.commit(&error) || !htmlFile.commit(&error)) return fail(error);
 
     // The summary stays off standard output when a stream is written there.
     std::ostream& summary =
-        (eventsFile.isStandardOutput() || logFile.isStandardOutput()) ? std::cerr : std::cout;
-    printSummary(summary, recording, host, score, timeline.finish(), tally, logCounts);
+        (eventsFile.isStandardOutput() || logFile.isStandardOutput() || htmlFile.isStandardOutput()) ? std::cerr
+                                                                                                     : std::cout;
+    printSummary(summary, recording, host, score, finished, tally, logCounts);
     return 0;
 }
 

@@ -13,6 +13,7 @@ struct ReplayOptions {
     std::string input;      // empty: the bundled demonstration recording
     std::string eventsOut;  // empty: no event stream
     std::string logOut;     // empty: no log stream
+    std::string html;       // empty: no HTML page
     std::string plugIn;     // empty: ORVANE_PLUGIN_PATH or the build's plug-in folder
     bool verbose = false;
     evemu::EvemuOptions evemu;  // how to read an evemu recording

@@ -98,6 +98,10 @@ int run(int argc, char** argv) {
                               "Write the log stream (*.log.jsonl: the filter's log lines) to FILE; - is standard "
                               "output.")
         ->type_name("FILE");
+    replayCommand->add_option("--html", replay.html,
+                              "Write one self-contained HTML page to FILE: the surface with each finger's path, the "
+                              "click and thumb zones, and the gesture timeline; - is standard output.")
+        ->type_name("FILE");
     replayCommand->add_flag("--verbose,-v", replay.verbose,
                             "Answer the internal-build question with yes (ORVANE_INTERNAL_BUILD=1) and turn on "
                             "debug logging, so the filter's debug diagnostics run too. Without --log-out they go "
