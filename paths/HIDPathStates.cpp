@@ -216,6 +216,41 @@ void HIDPathStates::checkForRestingThumb() {
 }
 
 void HIDPathStates::updateSpeedSymmetriesOfAllPaths() {
+    // The touching fingers are gathered once; each one's symmetry is then worked out against
+    // the others of the same list, which is what asking every path in turn would gather.
+    std::array<HIDParserPath*, kMaxPaths> fingers{};
+    std::array<HIDPoint, kMaxPaths> velocities{};
+    std::array<float, kMaxPaths> speeds{};
+    size_t numFingers = 0;
+    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
+        HIDParserPath* path = getParserPathforPathID(id);
+        if (!path) continue;
+        if (path->currentContact().path_id == id && path->isFingerOrRestingContact() && path->isTouching()) {
+            fingers[numFingers] = path;
+            velocities[numFingers] = path->dampedVelocity();
+            speeds[numFingers] = path->dampedSpeed();
+            ++numFingers;
+        } else if (!path->isTouching()) {
+            path->clearPathSpeedSymmetry();
+        }
+    }
+
+    std::array<HIDPoint, kMaxPaths> otherVelocities{};
+    std::array<float, kMaxPaths> otherSpeeds{};
+    for (size_t k = 0; k < numFingers; ++k) {
+        size_t numOthers = 0;
+        for (size_t j = 0; j < numFingers; ++j) {
+            if (j == k) continue;
+            otherVelocities[numOthers] = velocities[j];
+            otherSpeeds[numOthers] = speeds[j];
+            ++numOthers;
+        }
+        fingers[k]->set_2F_speed_symmetry(
+            speedSymmetryAmongFingers(velocities[k], speeds[k], otherVelocities.data(), otherSpeeds.data(), numOthers));
+    }
+}
+
+void HIDPathStates::updateSpeedSymmetriesOfAllPathsOneByOne() {
     for (int id = kFirstPathID; id <= kLastPathID; ++id) {
         HIDParserPath* path = getParserPathforPathID(id);
         if (!path) continue;
@@ -227,9 +262,8 @@ void HIDPathStates::updateSpeedSymmetriesOfAllPaths() {
 }
 
 void HIDPathStates::computePathAndFingerSpeedSymmetries(int pathID) {
-    // Slot 0 of the velocities is kept for the desired path's own velocity.
-    std::array<HIDPoint, kMaxPaths + 1> velocities{};
-    std::array<float, kMaxPaths> speeds{};
+    std::array<HIDPoint, kMaxPaths> otherVelocities{};
+    std::array<float, kMaxPaths> otherSpeeds{};
     size_t numOthers = 0;
     float desiredSpeed = 0.0f;
     HIDPoint desiredVelocity{};
@@ -245,11 +279,26 @@ void HIDPathStates::computePathAndFingerSpeedSymmetries(int pathID) {
             desiredSpeed = path->dampedSpeed();
             desiredVelocity = path->dampedVelocity();
         } else if (numOthers < kMaxPaths) {
-            velocities[numOthers + 1] = path->dampedVelocity();
-            speeds[numOthers] = path->dampedSpeed();
+            otherVelocities[numOthers] = path->dampedVelocity();
+            otherSpeeds[numOthers] = path->dampedSpeed();
             ++numOthers;
         }
     }
+
+    if (!desired) desired = getParserPathforPathID(pathID);
+    if (!desired) return;
+    desired->set_2F_speed_symmetry(speedSymmetryAmongFingers(desiredVelocity, desiredSpeed, otherVelocities.data(),
+                                                             otherSpeeds.data(), numOthers));
+}
+
+float HIDPathStates::speedSymmetryAmongFingers(HIDPoint desiredVelocity, float desiredSpeed,
+                                               const HIDPoint* otherVelocities, const float* otherSpeeds,
+                                               size_t numOthers) {
+    // Slot 0 of the velocities is kept for the desired path's own velocity.
+    std::array<HIDPoint, kMaxPaths + 1> velocities;
+    std::array<float, kMaxPaths> speeds;
+    std::copy(otherVelocities, otherVelocities + numOthers, velocities.begin() + 1);
+    std::copy(otherSpeeds, otherSpeeds + numOthers, speeds.begin());
 
     std::sort(speeds.begin(), speeds.begin() + numOthers, [](float a, float b) { return a > b; });
     // Slowest first and then reversed, so of equally fast fingers the higher path ID leads.
@@ -258,19 +307,15 @@ void HIDPathStates::computePathAndFingerSpeedSymmetries(int pathID) {
     std::reverse(others, others + numOthers);
     velocities[0] = desiredVelocity;
 
-    std::array<float, kMaxCosines> cosines{};
+    std::array<float, kMaxCosines> cosines;
     const size_t numCosines =
         getCosineThetas(std::span<const HIDPoint>(velocities.data(), numOthers + 1), std::span<float>(cosines));
 
-    if (!desired) desired = getParserPathforPathID(pathID);
-    if (!desired) return;
     if (desiredSpeed > 0.0f) {
-        desired->set_2F_speed_symmetry(compute_2F_path_speed_symmetry(
-            std::span<const float>(speeds.data(), numOthers), std::span<const float>(cosines.data(), numCosines),
-            desiredSpeed));
-    } else {
-        desired->set_2F_speed_symmetry(0.0f);
+        return compute_2F_path_speed_symmetry(std::span<const float>(speeds.data(), numOthers),
+                                              std::span<const float>(cosines.data(), numCosines), desiredSpeed);
     }
+    return 0.0f;
 }
 
 float HIDPathStates::compute_2F_path_speed_symmetry(std::span<const float> speeds, std::span<const float> cosineThetas,

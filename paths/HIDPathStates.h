@@ -26,7 +26,11 @@ public:
 
     void checkForRestingThumb();
     float getMaxThumbRestingHeight(const HIDParserPath* path) const;
+    // Every touching finger's speed symmetry against the other touching fingers, the fingers
+    // gathered once for the frame.
     void updateSpeedSymmetriesOfAllPaths();
+    // The same, asking computePathAndFingerSpeedSymmetries of each path in turn.
+    void updateSpeedSymmetriesOfAllPathsOneByOne();
     void computePathAndFingerSpeedSymmetries(int pathID);
     static float compute_2F_path_speed_symmetry(std::span<const float> speeds, std::span<const float> cosineThetas,
                                                 float desiredPathSpeed);
@@ -49,6 +53,11 @@ public:
     HID_PROPERTY(float, maxMotionDeltasResting, setMaxMotionDeltasResting)
 
 private:
+    // The symmetry of one finger's damped motion with the other fingers' (given in path order).
+    static float speedSymmetryAmongFingers(HIDPoint desiredVelocity, float desiredSpeed,
+                                           const HIDPoint* otherVelocities, const float* otherSpeeds,
+                                           size_t numOthers);
+
     int buttonState_ = 0;
     int previousButtonState_ = 0;
     double divingButtonChangeTimestamp_ = 0.0;
