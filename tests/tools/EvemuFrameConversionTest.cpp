@@ -231,8 +231,8 @@ TEST(EvemuFrameConversion, SizeGivenInMillimetresIsFixedPointCentimetres) {
 TEST(EvemuFrameConversion, SizeReplacesTheOneFromTheResolutions) {
     EvemuOptions options;
     options.size = SurfaceSize{99.5, 62.25};
-    const PropertyValue& size =
-        converted("clickpad.evemu", options).header.service.properties.at("SurfaceDimensions");
+    const formats::FrameRecording recording = converted("clickpad.evemu", options);
+    const PropertyValue& size = recording.header.service.properties.at("SurfaceDimensions");
     // 9.95 cm * 65536 = 652083.2 -> 652083; 6.225 cm * 65536 = 407961.6 -> 407962.
     EXPECT_EQ(size.find("Width")->integerValue(), 652083);
     EXPECT_EQ(size.find("Height")->integerValue(), 407962);
