@@ -11,6 +11,7 @@
 #include <cstring>
 #include <cstdint>
 #include <limits>
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -162,6 +163,8 @@ struct Coordinates {
     double x, y;
 };
 
+void PrintTo(const Coordinates& c, std::ostream* os) { *os << c.name; }
+
 class CarriedCoordinates : public testing::TestWithParam<Coordinates> {};
 
 // The hand event carries the contact's own x, and y flipped for the UI (1 - y), whatever
@@ -311,6 +314,8 @@ struct ScanTimeCase {
     std::vector<uint8_t> data;
     bool logged;
 };
+
+void PrintTo(const ScanTimeCase& c, std::ostream* os) { *os << c.name; }
 
 class HostileScanTime : public testing::TestWithParam<ScanTimeCase> {};
 
