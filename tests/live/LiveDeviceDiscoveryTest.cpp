@@ -75,7 +75,8 @@ TEST(DeviceDiscovery, BitmapsOfSeveralWordsCountFromTheLastWord) {
     sys.add(3, "Synaptics TM3276-022", std::string("1 ") + kTouchpadAxes, "1", "0", true, "0011");
     // The same bits one word up are codes 64 and above: no touchpad.
     sys.add(4, "Not a touchpad", std::string(kTouchpadAxes) + " 0", "1");
-    const auto pads = scanInputDevices(sys.sysfs(), sys.devices()).touchpads();
+    const InputDeviceScan scan = scanInputDevices(sys.sysfs(), sys.devices());
+    const auto pads = scan.touchpads();
     ASSERT_EQ(pads.size(), 1u);
     EXPECT_EQ(pads[0]->number, 3);
 }
@@ -121,7 +122,8 @@ TEST(DeviceDiscovery, TheChoiceTakesTheFirstReadableTouchpadOrTheOneAskedFor) {
 TEST(DeviceDiscovery, NoTouchpadAtAllChoosesNothing) {
     FakeSystem sys;
     sys.add(1, "Power Button", "0", "0");
-    EXPECT_EQ(chooseTouchpad(scanInputDevices(sys.sysfs(), sys.devices()), ""), nullptr);
+    const InputDeviceScan scan = scanInputDevices(sys.sysfs(), sys.devices());
+    EXPECT_EQ(chooseTouchpad(scan, ""), nullptr);
     EXPECT_TRUE(scanInputDevices(sys.folder.file("nothing-here"), sys.devices()).devices.empty());
 }
 
@@ -135,18 +137,18 @@ TEST(DeviceAccess, APermissionProblemNamesTheGroupToJoin) {
     ASSERT_EQ(::chmod(node.c_str(), 0640), 0);
     EXPECT_EQ(describeOpenFailure(node, EACCES),
               node + ": permission denied: the device belongs to the group daemon; join it (sudo usermod -aG "
-                     "daemon $USER, then log in again) or run as root");
+                     "daemon $USER, then log in again) or install the udev rule data/70-orvane.rules");
     // A node no group may read: the rule is what is missing.
     ASSERT_EQ(::chmod(node.c_str(), 0600), 0);
     EXPECT_EQ(describeOpenFailure(node, EACCES),
-              node + ": permission denied: no group may read it; install the udev rule data/70-orvane.rules and "
-                     "join the group input, or run as root");
+              node + ": permission denied: install the udev rule data/70-orvane.rules (it lets the user at the "
+                     "seat read touchpads and lid switches) or run as root");
 }
 
 TEST(DeviceAccess, TheVirtualPointerNamesTheRuleOrTheModule) {
     EXPECT_EQ(describeOpenFailure("/dev/uinput", EACCES),
-              "/dev/uinput: permission denied: install the udev rule data/70-orvane.rules (it lets the group input "
-              "make virtual devices), join the group input, or run as root");
+              "/dev/uinput: permission denied: install the udev rule data/70-orvane.rules (it lets the user at the "
+              "seat and the group input make virtual devices) or run as root");
     EXPECT_EQ(describeOpenFailure("/dev/uinput", ENOENT), "/dev/uinput: not there: load the uinput module (sudo "
                                                           "modprobe uinput)");
     EXPECT_EQ(describeOpenFailure("/dev/input/event5", ENODEV), "/dev/input/event5: no such device");

@@ -3,7 +3,7 @@
 // stops reading, or goes away, is dropped without ever holding up the input path.
 //
 // Frames come from the hand builder straight into the bridge. The surface is 1000 × 500
-// units (SurfaceDimensions 100.0 × 50.0 in 16.16), frames 8 ms apart; the fingers stay at
+// units (SurfaceDimensions 100.0 × 50.0, 16.16 fixed-point centimetres), frames 8 ms apart; the fingers stay at
 // y = 200, away from the edges, off the diving button and above the thumb zone. A first
 // step of 10 moves a finger's steadied position by 9.95 (the hysteresis radius is 0.05),
 // later steps by 10; both are 15 quanta of 0.635 = 9.525.

@@ -545,6 +545,47 @@ TEST(LiveVanishing, WithWaitATouchpadThatIsNotThereYetIsWaitedFor) {
     EXPECT_EQ(count(live.capture.written, {EV_KEY, BTN_RIGHT, 1}), 1);
 }
 
+TEST(LiveStop, AStopRequestEndsTheRunReleasesTheButtonsAndCancelsTheFilter) {
+    // A finger moves for 600 frames with the right button held from the second frame on.
+    // SIGINT and SIGTERM write to the stop descriptor; here that happens while event 600
+    // is read, and the loop stops when it next looks around (after event 1023: a source
+    // without a descriptor is read 512 events at a time).
+    std::vector<evemu::EvdevEvent> events = fingerWithRightButtonHeld();
+    for (int i = 0; i < 600; ++i) {
+        const uint64_t t = events.back().time_ns + 8'000'000;
+        events.push_back({t, evemu::kEvAbs, evemu::kAbsMtPositionX, 500 + (i % 2)});
+        events.push_back({t, evemu::kEvSyn, evemu::kSynReport, 0});
+    }
+    int stop[2];
+    ASSERT_EQ(::pipe(stop), 0);
+    auto source = std::make_unique<RecordingSource>(padWithButtons(), events);
+    source->whenHandingOver(600, [&] {
+        const char byte = 1;
+        EXPECT_EQ(::write(stop[1], &byte, 1), 1);
+    });
+    LiveRun live;
+    live.devices.sources.push_back(std::move(source));
+    BridgeSettings s;
+    s.plugInPath = test::kPlugInModule;
+    s.keyboardCover = true;
+    LiveRunner runner(live.devices, live.bridge, &live.gestures, live.messages);
+    EXPECT_EQ(runner.run(s, false, stop[0]), 0) << live.messages.str();
+    ::close(stop[0]);
+    ::close(stop[1]);
+    // Events 0 to 1023 were read: the first 11 frames are 27 events (6 for the touch, 2 a
+    // frame after it, 1 more for the button), then each frame is 2 events, its SYN_REPORT
+    // at 28 + 2k: k = 0 to 497 are read, 498 frames. 11 + 498 = 509 of the 611.
+    EXPECT_EQ(live.bridge.framesHandled(), 509u);
+    // The button was down when the stop came, and the stop released it.
+    EXPECT_EQ(count(live.capture.written, {EV_KEY, BTN_RIGHT, 1}), 1);
+    ASSERT_GE(live.capture.written.size(), 2u);
+    EXPECT_EQ(std::vector<W>(live.capture.written.end() - 2, live.capture.written.end()),
+              (std::vector<W>{{EV_KEY, BTN_RIGHT, 0}, {EV_SYN, SYN_REPORT, 0}}));
+    // The filter was cancelled and the plug-in unloaded.
+    EXPECT_FALSE(live.bridge.isRunning());
+    EXPECT_FALSE(live.bridge.host().isLoaded());
+}
+
 TEST(LiveLid, TheLidIsReportedAsTheSurfaceCovered) {
     const std::vector<evemu::EvdevEvent> events = fingerWithRightButtonHeld();
     LiveRun live;

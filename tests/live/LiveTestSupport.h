@@ -9,6 +9,7 @@
 
 #include <cstdlib>
 #include <deque>
+#include <functional>
 #include <map>
 #include <memory>
 #include <string>
@@ -145,6 +146,11 @@ public:
     }
     // The device goes away instead of handing over event `at`.
     void vanishAt(size_t at) { vanishAt_ = at; }
+    // Calls `what` when event `at` is handed over.
+    void whenHandingOver(size_t at, std::function<void()> what) {
+        hookAt_ = at;
+        hook_ = std::move(what);
+    }
 
     const evemu::EvdevDevice& device() const override { return device_; }
     const std::string& path() const override { return path_; }
@@ -152,6 +158,7 @@ public:
     ReadStatus next(evemu::EvdevEvent* event, std::string*) override {
         if (next_ == vanishAt_) return ReadStatus::Gone;
         if (next_ >= events_.size()) return ReadStatus::End;
+        if (next_ == hookAt_ && hook_) hook_();
         *event = events_[next_++];
         return ReadStatus::Event;
     }
@@ -163,6 +170,8 @@ private:
     std::vector<evemu::EvdevEvent> events_;
     size_t next_ = 0;
     size_t vanishAt_ = static_cast<size_t>(-1);
+    size_t hookAt_ = static_cast<size_t>(-1);
+    std::function<void()> hook_;
 };
 
 class FakeLid : public LidSwitch {

@@ -26,15 +26,16 @@ std::string describeOpenFailure(const std::string& path, int errorNumber) {
     if (errorNumber == EACCES || errorNumber == EPERM) {
         if (isUinput(path)) {
             return path + ": permission denied: install the udev rule data/" + std::string(kUdevRuleName) +
-                   " (it lets the group input make virtual devices), join the group input, or run as root";
+                   " (it lets the user at the seat and the group input make virtual devices) or run as root";
         }
         const std::string group = readingGroup(path);
         if (!group.empty()) {
             return path + ": permission denied: the device belongs to the group " + group +
-                   "; join it (sudo usermod -aG " + group + " $USER, then log in again) or run as root";
+                   "; join it (sudo usermod -aG " + group + " $USER, then log in again) or install the udev rule data/" +
+                   std::string(kUdevRuleName);
         }
-        return path + ": permission denied: no group may read it; install the udev rule data/" +
-               std::string(kUdevRuleName) + " and join the group input, or run as root";
+        return path + ": permission denied: install the udev rule data/" + std::string(kUdevRuleName) +
+               " (it lets the user at the seat read touchpads and lid switches) or run as root";
     }
     if (errorNumber == ENOENT || errorNumber == ENODEV || errorNumber == ENXIO) {
         if (isUinput(path)) return path + ": not there: load the uinput module (sudo modprobe uinput)";

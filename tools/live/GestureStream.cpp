@@ -51,7 +51,6 @@ GestureStream::~GestureStream() {
         ::close(listener_);
         ::unlink(path_.c_str());
     }
-    if (printed_ >= 0 && printedFlags_ >= 0) ::fcntl(printed_, F_SETFL, printedFlags_);
 }
 
 bool GestureStream::listen(const std::string& path, std::string* error) {
@@ -84,11 +83,7 @@ bool GestureStream::listen(const std::string& path, std::string* error) {
     return true;
 }
 
-void GestureStream::printTo(int descriptor) {
-    printed_ = descriptor;
-    printedFlags_ = ::fcntl(descriptor, F_GETFL);
-    if (printedFlags_ >= 0) ::fcntl(descriptor, F_SETFL, printedFlags_ | O_NONBLOCK);
-}
+void GestureStream::printTo(int descriptor) { printed_ = descriptor; }
 
 void GestureStream::deliver(const HIDEvent& event) {
     if (listener_ < 0 && printed_ < 0) return;
@@ -126,23 +121,33 @@ void GestureStream::publish(std::string_view line) {
 
 void GestureStream::print(std::string_view line) {
     if (printed_ < 0) return;
-    // Written whole or not at all, so that the output stays whole lines.
+    // Standard output is not made non-blocking (that would change it for every process
+    // sharing it, standard error too); a line goes out only when there is room for it now.
+    pollfd p{printed_, POLLOUT, 0};
+    if (::poll(&p, 1, 0) < 0 || (p.revents & (POLLERR | POLLHUP | POLLNVAL))) {
+        ++printedLinesLeftOut_;
+        if (p.revents & (POLLERR | POLLHUP | POLLNVAL)) printed_ = -1;  // the reader is gone
+        return;
+    }
+    if (!(p.revents & POLLOUT)) {
+        ++printedLinesLeftOut_;
+        return;
+    }
     printing_.assign(line);
     printing_.push_back('\n');
-    const ssize_t n = ::write(printed_, printing_.data(), printing_.size());
-    if (n == static_cast<ssize_t>(printing_.size())) return;
-    if (n > 0) {
-        // The rest of a line the output took in part: finish it, a little at a time if need be.
-        size_t done = static_cast<size_t>(n);
-        for (int tries = 0; done < printing_.size() && tries < 100; ++tries) {
-            const ssize_t m = ::write(printed_, printing_.data() + done, printing_.size() - done);
-            if (m > 0) done += static_cast<size_t>(m);
-            else if (m < 0 && errno != EAGAIN && errno != EINTR) break;
+    size_t done = 0;
+    while (done < printing_.size()) {
+        const ssize_t n = ::write(printed_, printing_.data() + done, printing_.size() - done);
+        if (n > 0) {
+            done += static_cast<size_t>(n);
+        } else if (n < 0 && errno == EINTR) {
+            continue;
+        } else {
+            ++printedLinesLeftOut_;
+            printed_ = -1;  // the reader is gone
+            return;
         }
-        if (done == printing_.size()) return;
     }
-    ++printedLinesLeftOut_;
-    if (n < 0 && errno != EAGAIN && errno != EINTR) printed_ = -1;  // the reader is gone
 }
 
 bool GestureStream::send(Client& client) {

@@ -36,8 +36,9 @@ public:
     // Listens on a Unix stream socket at `path`. A socket file left behind by a process that
     // is gone is replaced; one that still answers, or any other file, is an error.
     bool listen(const std::string& path, std::string* error);
-    // Also writes every line to this descriptor (standard output), made non-blocking for
-    // as long as the stream lives.
+    // Also writes every line to this descriptor (standard output): a line when the
+    // descriptor has room for it at once (a pipe always takes a line shorter than its
+    // 4 KiB atomic write whole when it says it has room), otherwise the line is left out.
     void printTo(int descriptor);
 
     // One event the filter delivered: a line for it, or for each of its children, that is a
@@ -80,7 +81,6 @@ private:
     std::string path_;
     std::vector<Client> clients_;
     int printed_ = -1;
-    int printedFlags_ = -1;  // to put back
     std::string line_;       // reused for every line
     std::string printing_;   // the line being printed
     uint64_t linesPublished_ = 0;

@@ -73,7 +73,9 @@ LiveRunner::End LiveRunner::pump(EventSource& source, int stopDescriptor, std::s
         if (lidDescriptor >= 0 && readable(fds[lidAt])) watchLid();
         if (sourceDescriptor >= 0 && !readable(fds[sourceAt])) continue;
 
-        for (int n = 0; n < kEventsPerRound; ++n) {
+        // A device is read until it has nothing more (libevdev may hold events its descriptor
+        // no longer shows); a source that is always ready gives the loop a turn now and then.
+        for (int n = 0; sourceDescriptor >= 0 || n < kEventsPerRound; ++n) {
             switch (source.next(&event, error)) {
             case ReadStatus::Event:
                 if (!bridge_.feed(event, error)) {

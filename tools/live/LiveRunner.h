@@ -19,7 +19,8 @@ namespace orvane::live {
 
 class LiveRunner {
 public:
-    // Events read in one go before the loop looks at its other descriptors again.
+    // Events read in one go from a source without a descriptor before the loop looks at its
+    // other descriptors again.
     static constexpr int kEventsPerRound = 512;
 
     // Messages for a person (one line each, "orvane: ...") go to `messages`.
