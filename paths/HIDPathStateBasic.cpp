@@ -121,10 +121,13 @@ int HIDPathStateBasic::countFingersOnDivingButton() {
     for (int id = kFirstPathID; id <= kLastPathID; ++id) {
         const HIDParserPath* path = getParserPathforPathID(id);
         if (!path) continue;
-        logVerbose("%s [parserPath isEdgeContact] %d _numNonEdgeTouches %d [parserPath isTouching] %d "
-                   "[parserPath isFingerOrRestingContact ] %d",
-                   kSignature, path->isEdgeContact(), numNonEdgeTouches_, path->isTouching(),
-                   path->isFingerOrRestingContact());
+        // Asked first, so the edge test of every path runs only for the diagnostics.
+        if (verboseDebugEnabled()) {
+            logVerbose("%s [parserPath isEdgeContact] %d _numNonEdgeTouches %d [parserPath isTouching] %d "
+                       "[parserPath isFingerOrRestingContact ] %d",
+                       kSignature, path->isEdgeContact(), numNonEdgeTouches_, path->isTouching(),
+                       path->isFingerOrRestingContact());
+        }
         // An edge-only palm-type contact counts only while at most one non-edge finger touches.
         const bool takesPart = path->isTouching() && (path->isFingerOrRestingContact() ||
                                                       (path->isEdgeContact() && numNonEdgeTouches_ <= 1));

@@ -150,14 +150,17 @@ void HIDPathStates::setRestingFlag(const HIDEventRef& frame) {
     for (const HIDEventRef& child : frame->children()) {
         const int id = pathIDOfContact(*child);
         const HIDParserPath* path = getParserPathforPathID(id);
-        const int64_t mask = child->integerValueForField(kHIDEventFieldDigitizerEventMask);
         if (path && path->isRestingInThumbZone() && path->isTouching() && path->wasTouching()) {
+            const int64_t mask = child->integerValueForField(kHIDEventFieldDigitizerEventMask);
             child->setIntegerValue(mask | kHIDDigitizerEventResting, kHIDEventFieldDigitizerEventMask);
             logVerbose("%s restingthumb path index %d eventmask %d", "-[HIDPathStates setRestingFlag:]", id,
                        static_cast<int>(mask));
         }
-        logVerbose("%s after eventmask %d path index %d", "-[HIDPathStates setRestingFlag:]",
-                   static_cast<int>(child->integerValueForField(kHIDEventFieldDigitizerEventMask)), id);
+        // Asked first, so the mask is read back only for the diagnostics.
+        if (verboseDebugEnabled()) {
+            logVerbose("%s after eventmask %d path index %d", "-[HIDPathStates setRestingFlag:]",
+                       static_cast<int>(child->integerValueForField(kHIDEventFieldDigitizerEventMask)), id);
+        }
     }
 }
 
@@ -414,8 +417,11 @@ void HIDPathStates::calculateNewHandCenter(const HIDEventRef& frame) {
         frame->setDoubleValue(sumX / count, kHIDEventFieldDigitizerX);
         frame->setDoubleValue(sumY / count, kHIDEventFieldDigitizerY);
     }
-    logVerbose("%s hand center (%f, %f)", "-[HIDPathStates calculateNewHandCenter:]",
-               frame->doubleValueForField(kHIDEventFieldDigitizerX), frame->doubleValueForField(kHIDEventFieldDigitizerY));
+    if (verboseDebugEnabled()) {
+        logVerbose("%s hand center (%f, %f)", "-[HIDPathStates calculateNewHandCenter:]",
+                   frame->doubleValueForField(kHIDEventFieldDigitizerX),
+                   frame->doubleValueForField(kHIDEventFieldDigitizerY));
+    }
 }
 
 size_t getCosineThetas(std::span<const HIDPoint> points, std::span<float> cosines) {
