@@ -111,7 +111,8 @@ HIDEventRef HIDGestureParser::prepareHandEventforUI(HIDHandStatistics& handStats
     const bool buttonChanged = handStats.currentButtonState() != handStats.lastButtonState();
     for (int i = handStats.numPaths() - 1; i >= 0; --i) {
         if (!frame || static_cast<size_t>(i) >= frame->children().size()) continue;
-        const HIDEventRef childRef = frame->children()[static_cast<size_t>(i)];
+        // Held by reference: the child is last used before it may be removed.
+        const HIDEventRef& childRef = frame->children()[static_cast<size_t>(i)];
         HIDEvent& child = *childRef;
         const int32_t idx = static_cast<int32_t>(child.integerValueForField(kHIDEventFieldDigitizerIndex));
         if (idx < 0 || idx >= kNumContactIndexes) continue;  // passed through untouched
