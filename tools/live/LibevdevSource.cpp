@@ -61,6 +61,32 @@ evemu::EvdevDevice describe(const libevdev* dev) {
     return d;
 }
 
+// The device's state as libevdev read it when it was opened, as events (see the header).
+std::vector<evemu::EvdevEvent> stateEvents(const libevdev* dev) {
+    std::vector<evemu::EvdevEvent> events;
+    timespec now{};
+    ::clock_gettime(CLOCK_MONOTONIC, &now);
+    const uint64_t t = static_cast<uint64_t>(now.tv_sec) * 1'000'000'000ull + static_cast<uint64_t>(now.tv_nsec);
+    auto add = [&](unsigned type, unsigned code, int value) {
+        events.push_back({t, static_cast<uint16_t>(type), static_cast<uint16_t>(code), value});
+    };
+    const int slots = libevdev_get_num_slots(dev);
+    for (int slot = 0; slot < slots; ++slot) {
+        const int id = libevdev_get_slot_value(dev, static_cast<unsigned>(slot), ABS_MT_TRACKING_ID);
+        if (id < 0) continue;
+        add(EV_ABS, ABS_MT_SLOT, slot);
+        add(EV_ABS, ABS_MT_TRACKING_ID, id);
+        for (unsigned code = ABS_MT_SLOT + 1; code <= ABS_MAX; ++code)
+            if (code != ABS_MT_TRACKING_ID && libevdev_has_event_code(dev, EV_ABS, code))
+                add(EV_ABS, code, libevdev_get_slot_value(dev, static_cast<unsigned>(slot), code));
+    }
+    for (unsigned code = BTN_MISC; code <= BTN_TASK; ++code)
+        if (libevdev_has_event_code(dev, EV_KEY, code) && libevdev_get_event_value(dev, EV_KEY, code) != 0)
+            add(EV_KEY, code, 1);
+    if (slots > 0) add(EV_ABS, ABS_MT_SLOT, libevdev_get_current_slot(dev));
+    return events;
+}
+
 }  // namespace
 
 LibevdevSource::~LibevdevSource() {
@@ -98,6 +124,7 @@ std::unique_ptr<LibevdevSource> LibevdevSource::open(const std::string& path, bo
         source->grabbed_ = true;
     }
     source->device_ = describe(source->dev_);
+    source->state_ = stateEvents(source->dev_);
     return source;
 }
 
@@ -109,6 +136,10 @@ void LibevdevSource::ungrab() {
 int LibevdevSource::value(uint16_t type, uint16_t code) const { return libevdev_get_event_value(dev_, type, code); }
 
 ReadStatus LibevdevSource::next(evemu::EvdevEvent* event, std::string* error) {
+    if (stateHandedOver_ < state_.size()) {
+        *event = state_[stateHandedOver_++];
+        return ReadStatus::Event;
+    }
     for (;;) {
         input_event ev{};
         const int rc = libevdev_next_event(dev_, syncing_ ? LIBEVDEV_READ_FLAG_SYNC : LIBEVDEV_READ_FLAG_NORMAL, &ev);

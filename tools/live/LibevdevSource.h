@@ -5,9 +5,16 @@
 // nanoseconds. After a SYN_DROPPED the source follows libevdev's documented way: it hands
 // over the SYN_DROPPED, then the events libevdev makes in sync mode to bring the device's
 // state up to date (they end with a SYN_REPORT), then reads on normally.
+//
+// A device may be opened while fingers are on it or buttons are down. The first events a
+// source hands over describe that state as libevdev read it: every slot that has a contact
+// (ABS_MT_SLOT, its tracking ID and its other axes), the buttons that are down, and last the
+// slot the device sends to next. No SYN_REPORT follows them: they belong to the first
+// frame, as though the device had just reported them.
 
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "EventSource.h"
 
@@ -48,6 +55,8 @@ private:
     bool syncing_ = false;
     uint64_t resynchronisations_ = 0;
     evemu::EvdevDevice device_;
+    std::vector<evemu::EvdevEvent> state_;  // the state at opening, handed over first
+    size_t stateHandedOver_ = 0;
 };
 
 }  // namespace orvane::live
