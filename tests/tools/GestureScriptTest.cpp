@@ -248,7 +248,10 @@ INSTANTIATE_TEST_SUITE_P(
                   "3: a goes up before any frame has reported it down (line 2); frames are 8 ms apart"},
         BadScript{"ClickDownTwice", kSurface + "0 click down\n+8 click down\n",
                   "3: the click is already down (line 2)"},
-        BadScript{"ClickUpFirst", kSurface + "0 click up\n", "2: the click is already up"}),
+        BadScript{"ClickUpFirst", kSurface + "0 click up\n", "2: the click is already up"},
+        // 1000 Hz for a day, a finger down all the time.
+        BadScript{"TooManyFrames", kSurface + "rate 1000 Hz\n0 finger a down at 1 1\n86400000 end\n",
+                  "3: the session would have more than 200000 frames; is a contact left down?"}),
     [](const ::testing::TestParamInfo<BadScript>& info) { return std::string(info.param.name); });
 
 // ---------------------------------------------------------------------------------------

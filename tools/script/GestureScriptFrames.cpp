@@ -26,6 +26,9 @@ constexpr double kScanTimeUnit_ns = 100'000.0;
 // The client that sets the script's properties.
 constexpr uint64_t kSettingsClientID = 1;
 
+// More frames than a person would write a script for: a finger left down for hours.
+constexpr size_t kMaxFrames = 200'000;
+
 constexpr int64_t kFingerTransducer = kHIDDigitizerTransducerTypeFinger;
 constexpr int64_t kPalmTransducer = kHIDDigitizerTransducerTypePalm;
 
@@ -65,8 +68,10 @@ struct Contact {
 
 class Converter {
 public:
-    Converter(const GestureScript& script, formats::FrameRecording* out, std::string* error)
-        : script_(script), out_(out), error_(error) {}
+    // With `countOnly` the frames are counted and checked but not made: a first pass that
+    // finds every error, and a session too long, without building its events.
+    Converter(const GestureScript& script, formats::FrameRecording* out, std::string* error, bool countOnly)
+        : script_(script), out_(out), error_(error), countOnly_(countOnly) {}
 
     bool convert() {
         *out_ = formats::FrameRecording{};
@@ -93,6 +98,9 @@ public:
             const double t = frameTime(k);
             for (; next < script_.statements.size() && script_.statements[next].time_ms <= t; ++next)
                 if (!apply(script_.statements[next])) return false;
+            if (frames_ >= kMaxFrames)
+                return fail(lastLine_, "the session would have more than " + std::to_string(kMaxFrames) +
+                                           " frames; is a contact left down?");
             if (t >= end_ms && !anyMoveAfter(t)) {
                 emitFrame(k);
                 break;
@@ -146,6 +154,7 @@ private:
     }
 
     void addSetting(const Statement& st) {
+        if (countOnly_) return;
         if (!clientAdded_) {
             // Settings come from a client: the first one connects before it sets anything.
             formats::InputRecord client;
@@ -288,6 +297,13 @@ private:
         const bool clickChanged = clickDown_ != lastClickDown_;
         if (contacts_.empty() && !clickChanged && !clickDown_) return false;
 
+        if (countOnly_) {
+            for (Contact& c : contacts_) c.reported = true;
+            std::erase_if(contacts_, [](const Contact& c) { return c.lifting; });
+            lastClickDown_ = clickDown_;
+            ++frames_;
+            return true;
+        }
         const uint64_t timestamp = frameTimestamp(k);
         HIDEventRef frame = HIDEvent::create(kHIDEventTypeDigitizer, timestamp);
         int64_t eventMask = 0;
@@ -334,24 +350,30 @@ private:
 
         std::erase_if(contacts_, [](const Contact& c) { return c.lifting; });
         lastClickDown_ = clickDown_;
+        ++frames_;
         return true;
     }
 
     const GestureScript& script_;
     formats::FrameRecording* out_;
     std::string* error_;
+    bool countOnly_;
     std::vector<Contact> contacts_;  // in index order
     bool clientAdded_ = false;
     bool clickDown_ = false;
     bool lastClickDown_ = false;
     size_t clickLine_ = 0;
     size_t lastLine_ = 0;
+    size_t frames_ = 0;
 };
 
 }  // namespace
 
 bool gestureScriptToFrames(const GestureScript& script, formats::FrameRecording* out, std::string* error) {
-    Converter converter(script, out, error);
+    formats::FrameRecording counted;
+    Converter first(script, &counted, error, true);
+    if (!first.convert()) return false;
+    Converter converter(script, out, error, false);
     return converter.convert();
 }
 
