@@ -146,6 +146,7 @@ TEST_P(DroppedContactIndex, ChildIsDroppedFromThePathsAndCarriedUntouched) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Indexes, DroppedContactIndex,
+                         // 2^31 - 1 once overflowed when the resting mark added one to it
                          testing::Values(14, 15, -1, -2, int64_t{std::numeric_limits<int32_t>::max()},
                                          int64_t{std::numeric_limits<int32_t>::min()},
                                          // read as a 32-bit value: 2^32 + 20 is index 20
