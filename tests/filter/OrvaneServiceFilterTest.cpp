@@ -223,13 +223,17 @@ TEST(DispatchHandler, ForwardsToTheDispatcher) {
 
 TEST(DispatchHandler, DoesNothingWithoutADispatcher) {
     auto filter = OrvaneServiceFilter::initWithService(trackpadService());
-    auto dispatcher = std::make_shared<RecordingDispatcher>();
     HIDDispatchHandler handler = filter->parser()->dispatchHandler();
-    handler(HIDEvent::pointerEvent(1, 0, 0, 0, 1, 0));  // none set yet
+    handler(HIDEvent::pointerEvent(1, 0, 0, 0, 1, 0));  // none set yet: dropped, not kept for later
+    auto gone = std::make_shared<RecordingDispatcher>();
+    filter->setEventDispatcher(gone);
+    gone.reset();  // held weakly: gone
+    handler(HIDEvent::pointerEvent(2, 0, 0, 0, 1, 0));
+    auto dispatcher = std::make_shared<RecordingDispatcher>();
     filter->setEventDispatcher(dispatcher);
-    dispatcher.reset();  // held weakly: gone
-    handler(HIDEvent::pointerEvent(1, 0, 0, 0, 1, 0));
-    SUCCEED();
+    handler(HIDEvent::pointerEvent(3, 0, 0, 0, 1, 0));
+    ASSERT_EQ(dispatcher->events.size(), 1u);
+    EXPECT_EQ(dispatcher->events[0]->timestamp(), 3u);
 }
 
 TEST(DispatchHandler, DoesNothingOnceTheFilterIsGone) {
