@@ -156,6 +156,50 @@ INSTANTIATE_TEST_SUITE_P(Indexes, DroppedContactIndex,
                              return (v < 0 ? "minus" : "") + std::to_string(v < 0 ? -v : v);
                          });
 
+// Thirty contacts in one frame, indexes 0 to 29: the table takes 0 to 13 and drops the
+// sixteen others, which come after them and so lie past the positions the hand event walks
+// (fourteen paths, positions 0 to 13). The output is that of the same frames with the
+// fourteen alone, the dropped children riding along untouched; a frame with no children at
+// all then clears every path in both, and both return the bare pointer event of "all
+// contacts vanished".
+TEST(HostileChildren, ContactsBeyondTheFourteenSlotsAreDropped) {
+    PlugInSession clean, hostile;
+    ASSERT_TRUE(clean.opened() && hostile.opened());
+    for (int k = 0; k < 7; ++k) {
+        const uint64_t t = kStart + k * kFrame;
+        std::vector<HIDEventRef> fourteen, thirty;
+        if (k < 6) {
+            for (int i = 0; i < 30; ++i) {
+                const double x = 0.02 + 0.03 * i + 0.005 * k;
+                const double y = 0.2 + 0.02 * (i % 5);
+                auto child = finger(x, y, k == 0 ? 7 : 4, 1, i);
+                if (i < 14) fourteen.push_back(child->copy());
+                thirty.push_back(child);
+            }
+        }
+        const HIDEventRef a = clean.send(at(t, fourteen));
+        const HIDEventRef b = hostile.send(at(t, thirty));
+        const std::string what = "frame " + std::to_string(k);
+        expectSameOutput(a, b, k < 6 ? 16 : 0, what);
+        if (k < 6) {
+            const HIDEventRef hand = handEventOf(b);
+            ASSERT_TRUE(hand) << what;
+            ASSERT_EQ(hand->children().size(), 30u) << what;
+            for (int i = 14; i < 30; ++i) {
+                const HIDEvent& dropped = *hand->children()[static_cast<size_t>(i)];
+                EXPECT_EQ(dropped.integerValueForField(kHIDEventFieldDigitizerIndex), i) << what;
+                EXPECT_FALSE(dropped.hasField(kHIDEventFieldDigitizerIdentity)) << what << " child " << i;
+                EXPECT_DOUBLE_EQ(dropped.doubleValueForField(kHIDEventFieldDigitizerY), 0.2 + 0.02 * (i % 5))
+                    << what << " child " << i;
+            }
+        } else {
+            ASSERT_TRUE(b) << what;
+            EXPECT_EQ(b->timestamp(), 0u);
+            EXPECT_TRUE(b->children().empty());
+        }
+    }
+}
+
 // ---------------------------------------------------------------------------------------
 // Coordinates that are not numbers, infinite, huge or off the surface
 
