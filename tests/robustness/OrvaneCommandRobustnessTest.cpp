@@ -61,6 +61,16 @@ TEST(OrvaneBadFiles, AKeyWithALineBreakStaysOnOneLine) {
     EXPECT_NE(r.err.find("in.frames.jsonl:2: unknown key \"time\\nstamp\""), std::string::npos) << r.err;
 }
 
+// A double field holding a string with a line break once split the message too.
+TEST(OrvaneBadFiles, AStringWithALineBreakStaysOnOneLine) {
+    const CommandResult r =
+        replayLeavingNothing(kHeader + "\n" + R"({"type": 11, "timestamp": 5, "fields": {"0xb0000": "In\nfinity"}})" +
+                             "\n");
+    expectOneClearLine(r, "");
+    EXPECT_NE(r.err.find("in.frames.jsonl:2: "), std::string::npos) << r.err;
+    EXPECT_NE(r.err.find("not the string \"In\\nfinity\""), std::string::npos) << r.err;
+}
+
 // Property values nested 100,000 deep once exhausted the stack; nesting is refused past 64.
 TEST(OrvaneBadFiles, DeeplyNestedPropertyValuesAreRefusedNotACrash) {
     const std::string deep = std::string(100000, '[') + std::string(100000, ']');

@@ -203,8 +203,8 @@ bool readField(HIDEvent& event, const std::string& key, const Json& value, std::
         } else if (value.is_string() && nonFiniteFromString(value.get_ref<const std::string&>(), &real)) {
         } else {
             if (value.is_string()) {
-                *error = where + " must be a number or \"NaN\", \"Infinity\", \"-Infinity\", not the string \"" +
-                         value.get<std::string>() + "\"";
+                *error = where + " must be a number or \"NaN\", \"Infinity\", \"-Infinity\", not the string " +
+                         jsonString(value.get_ref<const std::string&>());
                 return false;
             }
             break;
