@@ -25,7 +25,7 @@ constexpr float kDivingPairMaxHorizontalGap_mm = 30.0f;
 HIDPathStateBasic::HIDPathStateBasic(float height, float width) {
     paths_.reserve(kNumPaths);
     for (int i = 0; i < kNumPaths; ++i) paths_.push_back(HIDParserPath::initWithHeight(height, width));
-    for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) paths_[slot]->linkToTable(slot, &looseSlots_);
+    for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) paths_[slot]->linkToTable(slot, &marks_);
 }
 
 HIDPathStateBasic::~HIDPathStateBasic() {
@@ -44,6 +44,20 @@ bool HIDPathStateBasic::unpackContactFrame(const HIDEventRef& frame, double time
 void HIDPathStateBasic::clearExistingPathLiftoffsAndMasks(const HIDEventRef& frame) {
     if (!frame) return;
     // Clearing paths leaves the frame as it is, so its contact count is the same for every slot.
+    const bool noContacts = getNumberOfContacts(frame) == 0;
+    // A path that is already clear stays as it is when cleared again, so only the others are
+    // looked at; clearing one leaves the rest of the table's marks as they were.
+    for (uint32_t bits = marks_.dirtySlots & ~1u; bits != 0; bits &= bits - 1) {
+        HIDParserPath* path = paths_[static_cast<size_t>(std::countr_zero(bits))].get();
+        if (noContacts || path->currentContact().fingerTipSwitch == 0) {
+            // A lift-off stays visible for exactly one frame and is wiped here, on the next.
+            path->clear();
+        }
+    }
+}
+
+void HIDPathStateBasic::clearExistingPathLiftoffsAndMasksOneByOne(const HIDEventRef& frame) {
+    if (!frame) return;
     const bool noContacts = getNumberOfContacts(frame) == 0;
     for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) {
         HIDParserPath* path = paths_[slot].get();
@@ -104,23 +118,19 @@ int HIDPathStateBasic::countFingersOnDivingButton() {
     numNonEdgeTouches_ = 0;
     numTouches_ = 0;
     numPalms_ = 0;
-    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
-        const HIDParserPath* path = getParserPathforPathID(id);
-        if (!path) continue;
+    forEachPathByID([this](const HIDParserPath* path, int) {
         const bool touchingFinger = path->isTouching() && path->isFingerOrRestingContact();
         if (touchingFinger && !path->isEdgeContact()) ++numNonEdgeTouches_;
         if (touchingFinger) ++numTouches_;
         if (path->isPalmContact()) ++numPalms_;
-    }
+    });
 
     // The bottom-most path: the largest y less the downward excursion it has built up.
     float bestScore = kNoBottomScore_mm;
     float secondScore = kNoBottomScore_mm;
     int bestID = 0;
     int secondID = 0;
-    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
-        const HIDParserPath* path = getParserPathforPathID(id);
-        if (!path) continue;
+    forEachPathByID([&](const HIDParserPath* path, int id) {
         // Asked first, so the edge test of every path runs only for the diagnostics.
         if (verboseDebugEnabled()) {
             logVerbose("%s [parserPath isEdgeContact] %d _numNonEdgeTouches %d [parserPath isTouching] %d "
@@ -131,7 +141,7 @@ int HIDPathStateBasic::countFingersOnDivingButton() {
         // An edge-only palm-type contact counts only while at most one non-edge finger touches.
         const bool takesPart = path->isTouching() && (path->isFingerOrRestingContact() ||
                                                       (path->isEdgeContact() && numNonEdgeTouches_ <= 1));
-        if (!takesPart) continue;
+        if (!takesPart) return;
         const float score = path->currentContact().position.y - path->peakDisplacement();
         logVerbose("%s in here bottom_most_pidx %d peakdisplacement %f ypos_plus %f bottom_most_y_mm%f", kSignature,
                    bestID, path->peakDisplacement(), score, bestScore);
@@ -144,7 +154,7 @@ int HIDPathStateBasic::countFingersOnDivingButton() {
             secondScore = score;
             secondID = id;
         }
-    }
+    });
     bottomDivingPathIndex_ = bestID;
 
     numFingersOnDivingButton_ = 0;
@@ -180,10 +190,9 @@ void HIDPathStateBasic::updateFastestFingerSpeed() {
     float sumSpeed = 0.0f, sumSpeedSquared = 0.0f;
     float sumAbsX = 0.0f, sumXSquared = 0.0f;
     float sumAbsY = 0.0f, sumYSquared = 0.0f;
-    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
-        // By slot: a path whose contact carries another ID takes no part.
-        const HIDParserPath* path = getParserPath(id);
-        if (!path || path->currentContact().path_id != id || !path->isTouching()) continue;
+    // By slot: a path whose contact carries another ID takes no part.
+    forEachPathInOwnSlot([&](const HIDParserPath* path, int) {
+        if (!path->isTouching()) return;
         const float s = path->dampedSpeed();
         const HIDPoint v = path->dampedVelocity();
         sumSpeed += s;
@@ -197,7 +206,7 @@ void HIDPathStateBasic::updateFastestFingerSpeed() {
         const float squares = d.x * d.x + d.y * d.y;
         const double length = std::sqrt(static_cast<double>(squares));
         if (length > maxFingerSpeed_) maxFingerSpeed_ = static_cast<float>(length);
-    }
+    });
     // Weighted means that favour the fastest finger; the velocity components come out as
     // magnitudes (the sign is squared away), on purpose.
     if (sumSpeed > 0) dampedSpeedOfFastestFinger_ = sumSpeedSquared / sumSpeed;
@@ -208,14 +217,12 @@ void HIDPathStateBasic::updateFastestFingerSpeed() {
 bool HIDPathStateBasic::calculateCentroidOfPaths(HIDPoint* centroid) const {
     HIDPoint sum{0.0f, 0.0f};
     int count = 0;
-    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
-        const HIDParserPath* path = getParserPath(id);
-        if (!path || path->currentContact().path_id != id) continue;
-        if (!path->isFingerOrRestingContact() || !path->isTouching()) continue;
+    forEachPathInOwnSlot([&](const HIDParserPath* path, int) {
+        if (!path->isFingerOrRestingContact() || !path->isTouching()) return;
         sum.x += path->stablePositionForUI().x;
         sum.y += path->stablePositionForUI().y;
         ++count;
-    }
+    });
     if (count > 0 && centroid) {
         centroid->x = sum.x / static_cast<float>(count);
         centroid->y = sum.y / static_cast<float>(count);

@@ -3,7 +3,9 @@
 // indices 0..13), the unpacking of each contact frame into it, and the per-frame counts,
 // bottom-most path, diving-button membership, fastest-finger speeds and centroid.
 
+#include <bit>
 #include <memory>
+#include <type_traits>
 #include <vector>
 
 #include "common/HIDTypes.h"
@@ -39,13 +41,68 @@ public:
         // contacts into their own slots, so the search is for paths changed from outside.
         if (pathID >= 1 && pathID < kNumPaths) {
             HIDParserPath* own = paths_[static_cast<size_t>(pathID)].get();
-            if ((looseSlots_ & ((1u << pathID) - 1)) == 0 && own->currentContact().path_id == pathID) return own;
+            if ((marks_.looseSlots & ((1u << pathID) - 1)) == 0 && own->currentContact().path_id == pathID) return own;
         }
-        if (looseSlots_ == 0) return nullptr;
+        if (marks_.looseSlots == 0) return nullptr;
         return findParserPathforPathIDBySearch(pathID);
     }
     // The same answer found by looking at every slot in turn.
     HIDParserPath* findParserPathforPathIDBySearch(int pathID) const;
+
+    // Calls visit(path, id) for every ID from 1 to 14 for which getParserPathforPathID finds a
+    // path, in ascending ID order, as asking for each ID in turn would. While every contact
+    // carries its own slot's ID or none, these are exactly the slots whose contact carries
+    // their own ID, so only those are visited. A visit that returns bool stops the walk by
+    // returning true, and the walk then returns true. Visits must not change a contact's ID.
+    template <typename Visit>
+    bool forEachPathByID(Visit&& visit) const {
+        if (marks_.looseSlots == 0) {
+            for (uint32_t bits = marks_.ownSlots; bits != 0; bits &= bits - 1) {
+                const int id = std::countr_zero(bits);
+                if (visitStops(visit, paths_[static_cast<size_t>(id)].get(), id)) return true;
+            }
+            return false;
+        }
+        for (int id = kFirstSlot; id <= kLastSlot; ++id) {
+            HIDParserPath* path = getParserPathforPathID(id);
+            if (path && visitStops(visit, path, id)) return true;
+        }
+        return false;
+    }
+    // The same walk, asking getParserPathforPathID for every ID in turn.
+    template <typename Visit>
+    bool forEachPathByIDOneByOne(Visit&& visit) const {
+        for (int id = kFirstSlot; id <= kLastSlot; ++id) {
+            HIDParserPath* path = getParserPathforPathID(id);
+            if (path && visitStops(visit, path, id)) return true;
+        }
+        return false;
+    }
+    // Calls visit(path, slot) for every slot from 1 to 14 whose contact carries the slot's own
+    // ID, in ascending order. Visits must not change a contact's ID.
+    template <typename Visit>
+    void forEachPathInOwnSlot(Visit&& visit) const {
+        // A slot outside ownSlots carries its own ID only while it is loose.
+        for (uint32_t bits = marks_.ownSlots | marks_.looseSlots; bits != 0; bits &= bits - 1) {
+            const int slot = std::countr_zero(bits);
+            HIDParserPath* path = paths_[static_cast<size_t>(slot)].get();
+            if (path->currentContact().path_id == slot) visitStops(visit, path, slot);
+        }
+    }
+    // The same walk, looking at every slot.
+    template <typename Visit>
+    void forEachPathInOwnSlotOneByOne(Visit&& visit) const {
+        for (int slot = kFirstSlot; slot <= kLastSlot; ++slot) {
+            HIDParserPath* path = paths_[static_cast<size_t>(slot)].get();
+            if (path->currentContact().path_id == slot) visitStops(visit, path, slot);
+        }
+    }
+    // Slots whose path may differ from a cleared one (bit s for slot s); every other path of
+    // slots 1..14 is exactly as clear() leaves it.
+    uint32_t slotsNotClear() const { return marks_.dirtySlots; }
+    // The lift-off clearing that looks at every slot: clears every path of slots 1..14 when
+    // the frame has no contacts, else every path that does not touch.
+    void clearExistingPathLiftoffsAndMasksOneByOne(const HIDEventRef& frame);
 
     int countFingersOnDivingButton();
     bool anyNewContact() const { return numNewContacts_ > 0; }
@@ -67,10 +124,22 @@ public:
     HID_PROPERTY(unsigned int, currentlyTouchedZones, setCurrentlyTouchedZones)
 
 private:
+    static constexpr int kFirstSlot = 1;
+    static constexpr int kLastSlot = 14;
+
+    template <typename Visit>
+    static bool visitStops(Visit& visit, HIDParserPath* path, int id) {
+        if constexpr (std::is_same_v<std::invoke_result_t<Visit&, HIDParserPath*, int>, bool>) {
+            return visit(path, id);
+        } else {
+            visit(path, id);
+            return false;
+        }
+    }
+
     std::vector<std::shared_ptr<HIDParserPath>> paths_;
-    // Bit s is set while the contact of slot s may carry an ID other than s or 0 (the paths
-    // keep it up to date, see HIDParserPath::linkToTable).
-    uint32_t looseSlots_ = 0;
+    // Kept up to date by the paths themselves (see HIDParserPath::linkToTable).
+    HIDPathTableMarks marks_;
     int numNewContacts_ = 0;
     int numNonEdgeTouches_ = 0;
     int numTouches_ = 0;

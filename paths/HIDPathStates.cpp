@@ -106,38 +106,33 @@ bool HIDPathStates::buttonStateChanged() {
 }
 
 bool HIDPathStates::makeOrBreakTouchHappened(const HIDEventRef&) const {
-    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
-        const HIDParserPath* path = getParserPathforPathID(id);
-        if (!path) continue;
-        if (path->isMakeStage() || path->isLiftOffStage()) return true;
-    }
-    return false;
+    return forEachPathByID(
+        [](const HIDParserPath* path, int) { return path->isMakeStage() || path->isLiftOffStage(); });
 }
 
 void HIDPathStates::updateDivingBoardDisplacements() {
     earliestNonDivingTimestamp_ = 0.0;
-    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
-        const HIDParserPath* path = getParserPathforPathID(id);
-        if (!path || !path->isTouching() || !path->isFingerContact() || id == bottomDivingPathIndex()) continue;
+    const int bottom = bottomDivingPathIndex();
+    forEachPathByID([this, bottom](const HIDParserPath* path, int id) {
+        if (!path->isTouching() || !path->isFingerContact() || id == bottom) return;
         const double tMake = path->timestamps().t_makeTouch;
         if (earliestNonDivingTimestamp_ == 0.0 || tMake < earliestNonDivingTimestamp_) earliestNonDivingTimestamp_ = tMake;
-    }
+    });
 }
 
 void HIDPathStates::postFilteringTasks(const HIDEventRef& frame) {
     checkForRestingThumb();
     // The thumb-zone decision never changes in a frame where a finger touches down or lifts.
     if (!makeOrBreakTouchHappened(frame)) {
-        for (int id = kFirstPathID; id <= kLastPathID; ++id) {
-            HIDParserPath* path = getParserPathforPathID(id);
-            if (!path || path->isNoTrackingStage()) continue;
+        forEachPathByID([this](HIDParserPath* path, int id) {
+            if (path->isNoTrackingStage()) return;
             const bool resting = restingThumbExists_ && id == bottomDivingPathIndex() &&
                                  !(engagedinGesture_ && numTouches() == 2);
             path->setIsRestingInThumbZone(resting);
             logVerbose("%s restingthumexists %d divingpathID %d pathID %d isRestingthumbinzone %d",
                        "-[HIDPathStates postFilteringTasks:]", restingThumbExists_, bottomDivingPathIndex(), id,
                        path->isRestingInThumbZone());
-        }
+        });
     }
     updateSpeedSymmetriesOfAllPaths();
     breakOutOfRestingThumbBasedOnSymmetry();
@@ -225,9 +220,7 @@ void HIDPathStates::updateSpeedSymmetriesOfAllPaths() {
     std::array<HIDPoint, kMaxPaths> velocities{};
     std::array<float, kMaxPaths> speeds{};
     size_t numFingers = 0;
-    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
-        HIDParserPath* path = getParserPathforPathID(id);
-        if (!path) continue;
+    forEachPathByID([&](HIDParserPath* path, int id) {
         if (path->currentContact().path_id == id && path->isFingerOrRestingContact() && path->isTouching()) {
             fingers[numFingers] = path;
             velocities[numFingers] = path->dampedVelocity();
@@ -236,7 +229,7 @@ void HIDPathStates::updateSpeedSymmetriesOfAllPaths() {
         } else if (!path->isTouching()) {
             path->clearPathSpeedSymmetry();
         }
-    }
+    });
 
     std::array<HIDPoint, kMaxPaths> otherVelocities{};
     std::array<float, kMaxPaths> otherSpeeds{};
@@ -341,14 +334,13 @@ float HIDPathStates::compute_2F_path_speed_symmetry(std::span<const float> speed
 float HIDPathStates::computeSpeedSimilarity() const {
     float minimum = kSpeedSimilarityStartMinimum;
     float maximum = 0.0f;
-    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
-        const HIDParserPath* path = getParserPathforPathID(id);
-        if (!path || !path->isTouching() || !path->isFingerOrRestingContact()) continue;
+    forEachPathByID([&](const HIDParserPath* path, int) {
+        if (!path->isTouching() || !path->isFingerOrRestingContact()) return;
         float speed = lengthOf(path->getAverageVelocity_mm_s());
         if (speed < kStillFingerSpeed_mm_s) speed = 0.0f;
         minimum = std::min(minimum, speed);
         maximum = std::max(maximum, speed);
-    }
+    });
     return maximum > 0.0f ? minimum / maximum : 1.0f;
 }
 
@@ -359,9 +351,8 @@ void HIDPathStates::breakOutOfRestingThumbBasedOnSymmetry() {
     // worked out once, at the first tracked path.
     bool similarityKnown = false;
     float similarity = 0.0f;
-    for (int id = kFirstPathID; id <= kLastPathID; ++id) {
-        HIDParserPath* path = getParserPathforPathID(id);
-        if (!path || path->isNoTrackingStage()) continue;
+    forEachPathByID([&](HIDParserPath* path, int) {
+        if (path->isNoTrackingStage()) return;
         if (!similarityKnown) {
             similarity = computeSpeedSimilarity();
             similarityKnown = true;
@@ -392,7 +383,7 @@ void HIDPathStates::breakOutOfRestingThumbBasedOnSymmetry() {
             symmetry > kTranslationBreakOutMinSymmetry && speedSimilarity_ > kTranslationBreakOutMinSimilarity) {
             path->setIsRestingInThumbZone(false);
         }
-    }
+    });
 }
 
 void HIDPathStates::calculateNewHandCenter(const HIDEventRef& frame) {

@@ -27,6 +27,7 @@ float lengthOf(HIDPoint p) { return sqrtf(p.x * p.x + p.y * p.y); }
 HIDParserPath::HIDParserPath(float height, float width) : surfaceDimensions_{width, height} {}
 
 void HIDParserPath::updateCurPrevContactsWith(const HIDEvent& contact, double time) {
+    link_.markDirty();
     previousContact_ = currentContact_;
     currentContact_.device_timestamp = time;
 
@@ -94,6 +95,7 @@ void HIDParserPath::updatePathStageTimestamps(double time) {
 }
 
 void HIDParserPath::setPeakDisplacement() {
+    link_.markDirty();
     const HIDPoint d{currentContact_.position.x - initialPosition_.x, currentContact_.position.y - initialPosition_.y};
     const float distance = lengthOf(d);
     logVerbose("%s initial position (%f, %f) current (%f, %f)", "-[HIDParserPath setPeakDisplacement]",
@@ -135,6 +137,7 @@ bool HIDParserPath::applyAbsolutePixelHysteresis(HIDPoint value, HIDPoint& hyste
 }
 
 void HIDParserPath::filterContactForScreenUI(bool strongDamping) {
+    link_.markDirty();
     static constexpr const char* kSignature = "-[HIDParserPath filterContactForScreenUI:]";
     HIDContact& cur = currentContact_;
     const HIDContact& prev = previousContact_;
@@ -172,6 +175,7 @@ void HIDParserPath::filterContactForScreenUI(bool strongDamping) {
 }
 
 void HIDParserPath::updateDampedVelocity(bool strongDamping) {
+    link_.markDirty();
     const bool lifted = isMakeStage();
     if (lifted || strongDamping) weakenDampedVelocity(lifted ? 0.0f : kStrongDampingFactor);
 
@@ -194,6 +198,7 @@ void HIDParserPath::updateDampedVelocity(bool strongDamping) {
 }
 
 void HIDParserPath::weakenDampedVelocity(float factor) {
+    link_.markDirty();
     dampedVelocity_.x *= factor;
     dampedVelocity_.y *= factor;
     dampedSpeed_ *= factor;
@@ -232,6 +237,7 @@ void HIDParserPath::clear() {
     hysteresisCenter_ = HIDPoint{0.0f, 0.0f};
     pixelDelta_ = HIDPoint{0.0f, 0.0f};
     cumulativeDeltas_ = HIDPoint{0.0f, 0.0f};
+    link_.markClear();
 }
 
 void HIDParserPath::clearTimestamps(HIDPathTimestamps& timestamps) {

@@ -10,6 +10,25 @@
 
 namespace orvane {
 
+// What a path table knows of its paths without looking at each one; every path it owns keeps
+// its own bit of each mask up to date (see HIDParserPath::linkToTable).
+struct HIDPathTableMarks {
+    // Bit s: the contact of slot s may carry an ID other than s or 0.
+    uint32_t looseSlots = 0;
+    // Bit s, for a slot whose bit in looseSlots is clear: the contact of slot s carries s.
+    uint32_t ownSlots = 0;
+    // Bit s clear: the path of slot s is as clear() leaves it, so clearing it changes nothing.
+    uint32_t dirtySlots = 0;
+};
+
+// A property that clear() resets: setting it tells the path table the path is no longer clear.
+#define HID_CLEARED_PROPERTY(Type, name, Setter) \
+    Type name() const { return name##_; }        \
+    void Setter(Type value) {                    \
+        name##_ = value;                         \
+        link_.markDirty();                       \
+    }
+
 class HIDParserPath {
 public:
     // initWithHeight:width: — surfaceDimensions = {width, height}, everything else zero.
@@ -50,30 +69,43 @@ public:
     // linkToTable) until the contact is set again.
     HIDContact& getCurrentContact() {
         link_.markLoose();
+        link_.markDirty();
         return currentContact_;
     }
-    HIDContact& getPreviousContact() { return previousContact_; }
+    HIDContact& getPreviousContact() {
+        link_.markDirty();
+        return previousContact_;
+    }
     const HIDContact& currentContact() const { return currentContact_; }
     const HIDContact& previousContact() const { return previousContact_; }
     void setCurrentContact(const HIDContact& c) {
         currentContact_ = c;
         link_.noteID(currentContact_.path_id);
+        link_.markDirty();
     }
 
     // A path table finds its paths by ID without searching while every path's contact carries
-    // its own slot's ID or none. Each path it owns reports here, as a bit of `looseSlots`,
-    // whether its contact may carry another ID. nullptr unlinks the path.
-    void linkToTable(int slot, uint32_t* looseSlots) {
+    // its own slot's ID or none, visits only the paths whose contact carries their own slot's
+    // ID, and skips clearing paths that are already clear. Each path it owns keeps its slot's
+    // bits of `marks` up to date. nullptr unlinks the path.
+    void linkToTable(int slot, HIDPathTableMarks* marks) {
         link_.slot = slot;
-        link_.looseSlots = looseSlots;
+        link_.marks = marks;
         link_.noteID(currentContact_.path_id);
+        link_.markDirty();
     }
-    void setPreviousContact(const HIDContact& c) { previousContact_ = c; }
+    void setPreviousContact(const HIDContact& c) {
+        previousContact_ = c;
+        link_.markDirty();
+    }
 
     void updatePathStageTimestamps(double time);
     // Recomputes the peak displacement from the touch-down position.
     void setPeakDisplacement();
-    void setPeakDisplacement(float value) { peakDisplacement_ = value; }
+    void setPeakDisplacement(float value) {
+        peakDisplacement_ = value;
+        link_.markDirty();
+    }
 
     // One-axis hysteresis: moves `center` to within `radius` of `value`; returns whether it moved.
     static bool applyMinimumIncrementHysteresis(float value, float& center, float prevValueQuantized,
@@ -97,19 +129,19 @@ public:
     HID_PROPERTY(bool, thumbAboveTRZOnTouchdown, setThumbAboveTRZOnTouchdown)
     HID_PROPERTY(float, engagedSpeed, setEngagedSpeed)
     HID_PROPERTY(float, _2F_speed_symmetry, set_2F_speed_symmetry)
-    HID_PROPERTY(float, dampedSpeed, setDampedSpeed)
+    HID_CLEARED_PROPERTY(float, dampedSpeed, setDampedSpeed)
     float peakDisplacement() const { return peakDisplacement_; }
     HID_PROPERTY(HIDPoint, surfaceDimensions, setSurfaceDimensions)
-    HID_PROPERTY(HIDPoint, initialPosition, setInitialPosition)
-    HID_PROPERTY(HIDPoint, longTermPosition, setLongTermPosition)
-    HID_PROPERTY(HIDPoint, stablePositionForUI, setStablePositionForUI)
-    HID_PROPERTY(HIDPoint, previousStablePositionForUI, setPreviousStablePositionForUI)
-    HID_PROPERTY(HIDPoint, hysteresisCenter, setHysteresisCenter)
+    HID_CLEARED_PROPERTY(HIDPoint, initialPosition, setInitialPosition)
+    HID_CLEARED_PROPERTY(HIDPoint, longTermPosition, setLongTermPosition)
+    HID_CLEARED_PROPERTY(HIDPoint, stablePositionForUI, setStablePositionForUI)
+    HID_CLEARED_PROPERTY(HIDPoint, previousStablePositionForUI, setPreviousStablePositionForUI)
+    HID_CLEARED_PROPERTY(HIDPoint, hysteresisCenter, setHysteresisCenter)
     HID_PROPERTY(HIDPoint, ellipseHysteresisOffset, setEllipseHysteresisOffset)
-    HID_PROPERTY(HIDPoint, pixelDelta, setPixelDelta)
-    HID_PROPERTY(HIDPoint, cumulativeDeltas, setCumulativeDeltas)
+    HID_CLEARED_PROPERTY(HIDPoint, pixelDelta, setPixelDelta)
+    HID_CLEARED_PROPERTY(HIDPoint, cumulativeDeltas, setCumulativeDeltas)
     HID_PROPERTY(HIDPoint, engagedVelocity, setEngagedVelocity)
-    HID_PROPERTY(HIDPoint, dampedVelocity, setDampedVelocity)
+    HID_CLEARED_PROPERTY(HIDPoint, dampedVelocity, setDampedVelocity)
     const HIDPathTimestamps& timestamps() const { return timestamps_; }
     HIDPathTimestamps& timestamps() { return timestamps_; }
     void setTimestamps(const HIDPathTimestamps& t) { timestamps_ = t; }
@@ -119,21 +151,32 @@ private:
     // assigned over.
     struct TableLink {
         int slot = -1;
-        uint32_t* looseSlots = nullptr;
+        HIDPathTableMarks* marks = nullptr;
         TableLink() = default;
         TableLink(const TableLink&) {}
         TableLink& operator=(const TableLink&) = delete;
         void noteID(int32_t pathID) const {
-            if (!looseSlots) return;
+            if (!marks) return;
             const uint32_t bit = 1u << slot;
             if (pathID == 0 || pathID == slot) {
-                *looseSlots &= ~bit;
+                marks->looseSlots &= ~bit;
             } else {
-                *looseSlots |= bit;
+                marks->looseSlots |= bit;
+            }
+            if (pathID == slot) {
+                marks->ownSlots |= bit;
+            } else {
+                marks->ownSlots &= ~bit;
             }
         }
         void markLoose() const {
-            if (looseSlots) *looseSlots |= 1u << slot;
+            if (marks) marks->looseSlots |= 1u << slot;
+        }
+        void markDirty() const {
+            if (marks) marks->dirtySlots |= 1u << slot;
+        }
+        void markClear() const {
+            if (marks) marks->dirtySlots &= ~(1u << slot);
         }
     };
 

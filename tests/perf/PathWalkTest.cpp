@@ -1,0 +1,231 @@
+// The path table's walks visit only the paths that can take part and skip clearing paths that
+// are already clear; they give what looking at every slot in turn gives: on every frame of the
+// random sessions, and on tables whose paths are changed in every way a path allows, from
+// outside included.
+
+#include <gtest/gtest.h>
+
+#include <cstdio>
+#include <random>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "paths/HIDPathStates.h"
+#include "PerfSessions.h"
+
+namespace orvane {
+namespace {
+
+using Visits = std::vector<std::pair<const HIDParserPath*, int>>;
+
+Visits byIDWalk(const HIDPathStateBasic& table) {
+    Visits v;
+    table.forEachPathByID([&v](const HIDParserPath* p, int id) { v.emplace_back(p, id); });
+    return v;
+}
+Visits byIDOneByOne(const HIDPathStateBasic& table) {
+    Visits v;
+    table.forEachPathByIDOneByOne([&v](const HIDParserPath* p, int id) { v.emplace_back(p, id); });
+    return v;
+}
+Visits ownSlotWalk(const HIDPathStateBasic& table) {
+    Visits v;
+    table.forEachPathInOwnSlot([&v](const HIDParserPath* p, int slot) { v.emplace_back(p, slot); });
+    return v;
+}
+Visits ownSlotOneByOne(const HIDPathStateBasic& table) {
+    Visits v;
+    table.forEachPathInOwnSlotOneByOne([&v](const HIDParserPath* p, int slot) { v.emplace_back(p, slot); });
+    return v;
+}
+
+// A walk stopped at its k-th visit sees the first k visits of the whole walk and says it stopped.
+bool stopsAtEveryVisitAsTheWholeWalkSays(const HIDPathStateBasic& table, const Visits& whole) {
+    for (size_t k = 1; k <= whole.size(); ++k) {
+        Visits seen;
+        const bool stopped = table.forEachPathByID([&](const HIDParserPath* p, int id) {
+            seen.emplace_back(p, id);
+            return seen.size() == k;
+        });
+        if (!stopped || seen != Visits(whole.begin(), whole.begin() + static_cast<long>(k))) return false;
+    }
+    return !table.forEachPathByID([](const HIDParserPath*, int) { return false; });
+}
+
+std::string hex(float v) {
+    char b[32];
+    std::snprintf(b, sizeof b, "%a ", static_cast<double>(v));
+    return b;
+}
+std::string hex(double v) {
+    char b[32];
+    std::snprintf(b, sizeof b, "%a ", v);
+    return b;
+}
+std::string text(HIDPoint p) { return hex(p.x) + hex(p.y); }
+std::string text(const HIDContact& c) {
+    return std::to_string(c.fingerTipSwitch) + " " + std::to_string(c.fingerConfidence) + " " +
+           std::to_string(c.path_id) + " " + std::to_string(c.finger_id) + " " + text(c.velocity) +
+           hex(c.device_timestamp) + text(c.position);
+}
+
+// Everything a path shows, bit for bit.
+std::string stateOf(const HIDParserPath& p) {
+    const HIDPathTimestamps& t = p.timestamps();
+    return text(p.currentContact()) + "| " + text(p.previousContact()) + "| " + std::to_string(p.isResting()) +
+           std::to_string(p.isRestingInThumbZone()) + std::to_string(p.wasRestingInThumbZone()) +
+           std::to_string(p.thumbMovementTimedOut()) + std::to_string(p.thumbAboveTRZOnTouchdown()) + " " +
+           hex(p.engagedSpeed()) + hex(p._2F_speed_symmetry()) + hex(p.dampedSpeed()) + hex(p.peakDisplacement()) +
+           text(p.surfaceDimensions()) + text(p.initialPosition()) + text(p.longTermPosition()) +
+           text(p.stablePositionForUI()) + text(p.previousStablePositionForUI()) + text(p.hysteresisCenter()) +
+           text(p.ellipseHysteresisOffset()) + text(p.pixelDelta()) + text(p.cumulativeDeltas()) +
+           text(p.engagedVelocity()) + text(p.dampedVelocity()) + hex(t.t_cleanStartInRange) + hex(t.t_startInRange) +
+           hex(t.t_makeTouch) + hex(t.t_startHover) + hex(t.t_endHover) + hex(t.t_breakTouch) + hex(t.t_endOutRange);
+}
+
+// Slots the table takes for clear whose path clearing would still change.
+int clearSlotsThatAreNot(const HIDPathStateBasic& table) {
+    int wrong = 0;
+    for (int s = 1; s < HIDPathStateBasic::kNumPaths; ++s) {
+        if (table.slotsNotClear() & (1u << s)) continue;
+        const HIDParserPath& path = *table.getParserPath(s);
+        HIDParserPath cleared = path;  // a copy belongs to no table
+        cleared.clear();
+        if (stateOf(cleared) != stateOf(path)) ++wrong;
+    }
+    return wrong;
+}
+
+struct Tally {
+    int walkDifferences = 0;
+    int stopDifferences = 0;
+    int wronglyClear = 0;
+    int visits = 0;
+    int skippedAsClear = 0;
+};
+
+void check(const HIDPathStateBasic& table, Tally& tally) {
+    const Visits whole = byIDWalk(table);
+    if (whole != byIDOneByOne(table)) ++tally.walkDifferences;
+    if (ownSlotWalk(table) != ownSlotOneByOne(table)) ++tally.walkDifferences;
+    if (!stopsAtEveryVisitAsTheWholeWalkSays(table, whole)) ++tally.stopDifferences;
+    tally.wronglyClear += clearSlotsThatAreNot(table);
+    tally.visits += static_cast<int>(whole.size());
+    for (int s = 1; s < HIDPathStateBasic::kNumPaths; ++s) tally.skippedAsClear += (table.slotsNotClear() >> s & 1u) ? 0 : 1;
+}
+
+TEST(PathWalk, WalksAgreeWithLookingAtEverySlotOnEveryFrameOfTheRandomSessions) {
+    Tally tally;
+    int frames = 0;
+    perf::replayRandomSessions([&](HIDParser& parser, const HIDEventRef&) {
+        check(*parser.pathStates(), tally);
+        ++frames;
+    });
+    EXPECT_EQ(tally.walkDifferences, 0);
+    EXPECT_EQ(tally.stopDifferences, 0);
+    EXPECT_EQ(tally.wronglyClear, 0);
+    // Fingers were walked over on most frames and most slots were skipped as clear, so the
+    // agreement says something.
+    EXPECT_GT(tally.visits, frames);
+    EXPECT_GT(tally.skippedAsClear, frames * 5);
+}
+
+// Applies one random change of the kinds a path allows to a path of the table.
+class RandomChanges {
+public:
+    explicit RandomChanges(unsigned seed) : random_(seed) {}
+    int pick(int low, int high) { return std::uniform_int_distribution<int>(low, high)(random_); }
+    float any() { return pick(0, 3) == 0 ? 0.0f : static_cast<float>(pick(-50, 50)) / 4.0f; }
+
+    void apply(HIDPathStateBasic& table) {
+        HIDParserPath* path = table.getParserPath(pick(0, HIDPathStateBasic::kNumPaths - 1));
+        // Mostly an ordinary ID or none, now and then any number.
+        const int id = pick(0, 9) < 7 ? pick(0, 1) * pick(1, 14) : pick(-1, 16);
+        switch (pick(0, 14)) {
+        case 0: {
+            HIDContact c = path->currentContact();
+            c.path_id = id;
+            c.fingerTipSwitch = pick(0, 1);
+            path->setCurrentContact(c);
+            break;
+        }
+        case 1: path->getCurrentContact().path_id = id; break;
+        case 2: path->getCurrentContact().fingerTipSwitch = pick(0, 1); break;
+        case 3: path->getPreviousContact().position.x = any(); break;
+        case 4:
+        case 5: path->clear(); break;
+        case 6: path->setDampedVelocity(HIDPoint{any(), any()}); break;
+        case 7: path->setStablePositionForUI(HIDPoint{any(), any()}); break;
+        case 8: path->setPeakDisplacement(any()); break;
+        case 9: path->filterContactForScreenUI(pick(0, 1) == 1); break;
+        case 10: path->weakenDampedVelocity(0.5f); break;
+        case 11: path->setIsRestingInThumbZone(pick(0, 1) == 1); break;
+        default: {
+            HIDEventRef contact = HIDEvent::create(kHIDEventTypeDigitizer, 1);
+            contact->setIntegerValue(id - 1, kHIDEventFieldDigitizerIndex);
+            contact->setIntegerValue(pick(0, 1), kHIDEventFieldDigitizerTouch);
+            contact->setDoubleValue(any() / 20.0f, kHIDEventFieldDigitizerX);
+            contact->setDoubleValue(any() / 20.0f, kHIDEventFieldDigitizerY);
+            path->updateCurPrevContactsWith(*contact, static_cast<double>(pick(1, 100)));
+            break;
+        }
+        }
+    }
+
+private:
+    std::mt19937 random_;
+};
+
+TEST(PathWalk, WalksAgreeWithLookingAtEverySlotWhenPathsAreChangedInEveryWay) {
+    RandomChanges changes(20261122);
+    HIDPathStates table(500.0f, 1000.0f);
+    Tally tally;
+    for (int step = 0; step < 20000; ++step) {
+        changes.apply(table);
+        check(table, tally);
+    }
+    EXPECT_EQ(tally.walkDifferences, 0);
+    EXPECT_EQ(tally.stopDifferences, 0);
+    EXPECT_EQ(tally.wronglyClear, 0);
+    EXPECT_GT(tally.visits, 20000);
+    EXPECT_GT(tally.skippedAsClear, 20000);
+}
+
+// Two tables changed the same way; one clears lift-offs by the marks, the other by looking at
+// every slot, now and then with a frame without contacts. They stay alike throughout.
+TEST(PathWalk, ClearingOnlyTheSlotsNotClearLeavesTheTableAsClearingEverySlotDoes) {
+    RandomChanges first(77), second(77);
+    RandomChanges frames(5);
+    HIDPathStates byMarks(500.0f, 1000.0f);
+    HIDPathStates everySlot(500.0f, 1000.0f);
+    HIDEventRef empty = HIDEvent::create(kHIDEventTypeDigitizer, 1);
+    HIDEventRef oneContact = HIDEvent::create(kHIDEventTypeDigitizer, 1);
+    oneContact->appendEvent(HIDEvent::create(kHIDEventTypeDigitizer, 1));
+    int differences = 0;
+    int cleared = 0;
+    for (int step = 0; step < 20000; ++step) {
+        first.apply(byMarks);
+        second.apply(everySlot);
+        if (frames.pick(0, 3) == 0) {
+            const HIDEventRef& frame = frames.pick(0, 4) == 0 ? empty : oneContact;
+            byMarks.clearExistingPathLiftoffsAndMasks(frame);
+            everySlot.clearExistingPathLiftoffsAndMasksOneByOne(frame);
+            ++cleared;
+        }
+        for (int s = 0; s < HIDPathStateBasic::kNumPaths; ++s) {
+            if (stateOf(*byMarks.getParserPath(s)) != stateOf(*everySlot.getParserPath(s))) ++differences;
+        }
+        // The lookups by ID agree as well, loose slots included.
+        for (int id = -1; id <= 16; ++id) {
+            const HIDParserPath* a = byMarks.getParserPathforPathID(id);
+            const HIDParserPath* b = everySlot.getParserPathforPathID(id);
+            if ((a == nullptr) != (b == nullptr) || (a && stateOf(*a) != stateOf(*b))) ++differences;
+        }
+    }
+    EXPECT_EQ(differences, 0);
+    EXPECT_GT(cleared, 4000);
+}
+
+}  // namespace
+}  // namespace orvane
