@@ -290,6 +290,29 @@ void HIDPathStates::computePathAndFingerSpeedSymmetries(int pathID) {
 float HIDPathStates::speedSymmetryAmongFingers(HIDPoint desiredVelocity, float desiredSpeed,
                                                const HIDPoint* otherVelocities, const float* otherSpeeds,
                                                size_t numOthers) {
+    // With one other finger there is nothing to sort, and of the cosines only the first (the
+    // one between the two fingers) is read. The cosines are logged as they are worked out, so
+    // with the diagnostics on every one is.
+    if (numOthers == 1 && !verboseDebugEnabled()) {
+        if (!(desiredSpeed > 0.0f)) return 0.0f;
+        float cosine = 1.0f;
+        const float lengthA = lengthOf(desiredVelocity);
+        const float lengthB = lengthOf(otherVelocities[0]);
+        if (lengthA != 0.0f && lengthB != 0.0f) {
+            const double dot = static_cast<double>(desiredVelocity.x) * otherVelocities[0].x +
+                               static_cast<double>(desiredVelocity.y) * otherVelocities[0].y;
+            const double lengths = static_cast<double>(lengthA) * static_cast<double>(lengthB);
+            cosine = static_cast<float>(dot / lengths);
+        }
+        return compute_2F_path_speed_symmetry(std::span<const float>(otherSpeeds, 1), std::span<const float>(&cosine, 1),
+                                              desiredSpeed);
+    }
+    return speedSymmetryAmongFingersInFull(desiredVelocity, desiredSpeed, otherVelocities, otherSpeeds, numOthers);
+}
+
+float HIDPathStates::speedSymmetryAmongFingersInFull(HIDPoint desiredVelocity, float desiredSpeed,
+                                                     const HIDPoint* otherVelocities, const float* otherSpeeds,
+                                                     size_t numOthers) {
     // Slot 0 of the velocities is kept for the desired path's own velocity.
     std::array<HIDPoint, kMaxPaths + 1> velocities;
     std::array<float, kMaxPaths> speeds;

@@ -52,11 +52,16 @@ public:
     HID_PROPERTY(float, maxMotionDeltas, setMaxMotionDeltas)
     HID_PROPERTY(float, maxMotionDeltasResting, setMaxMotionDeltasResting)
 
-private:
     // The symmetry of one finger's damped motion with the other fingers' (given in path order).
     static float speedSymmetryAmongFingers(HIDPoint desiredVelocity, float desiredSpeed,
                                            const HIDPoint* otherVelocities, const float* otherSpeeds,
                                            size_t numOthers);
+    // The same, always sorting the other fingers and working out every cosine.
+    static float speedSymmetryAmongFingersInFull(HIDPoint desiredVelocity, float desiredSpeed,
+                                                 const HIDPoint* otherVelocities, const float* otherSpeeds,
+                                                 size_t numOthers);
+
+private:
 
     int buttonState_ = 0;
     int previousButtonState_ = 0;

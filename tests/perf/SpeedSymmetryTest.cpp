@@ -7,6 +7,7 @@
 #include <array>
 #include <cmath>
 #include <cstring>
+#include <limits>
 #include <random>
 
 #include "paths/HIDPathStates.h"
@@ -103,6 +104,42 @@ TEST(SpeedSymmetry, GatheredOnceAgreesWithEveryPathInTurnOnRandomTables) {
     }
     EXPECT_EQ(differences, 0);
     EXPECT_GT(crowded, 1000);  // many tables had most of the fourteen fingers down
+}
+
+// The bits of a float, so that NaN and -0 compare as well.
+uint32_t bitsOf(float v) {
+    uint32_t b;
+    std::memcpy(&b, &v, sizeof b);
+    return b;
+}
+
+// With one other finger the symmetry is worked out without sorting and from the one cosine it
+// reads; for every kind of value, zeros of both signs, NaN and infinities included, it is the
+// symmetry the full working gives.
+TEST(SpeedSymmetry, OneOtherFingerGivesWhatTheFullWorkingGivesForEveryKindOfValue) {
+    const float nan = std::numeric_limits<float>::quiet_NaN();
+    const float inf = std::numeric_limits<float>::infinity();
+    const std::array<float, 13> values{0.0f, -0.0f, 0.25f, -0.25f, 0.75f, 1.0f, -1.0f, 3.5f, -7.0f, 1e-30f, 1e30f, inf, nan};
+    std::mt19937 random(4711);
+    auto value = [&] { return values[std::uniform_int_distribution<size_t>(0, values.size() - 1)(random)]; };
+    int differences = 0;
+    int nonZero = 0;
+    int negative = 0;
+    for (int i = 0; i < 200000; ++i) {
+        const HIDPoint desired{value(), value()};
+        const HIDPoint other{value(), value()};
+        // Speeds mostly as the paths keep them (lengths, so never negative), now and then anything.
+        const float desiredSpeed = i % 7 == 0 ? value() : std::fabs(value());
+        const float otherSpeed = i % 5 == 0 ? value() : std::fabs(value());
+        const float fast = HIDPathStates::speedSymmetryAmongFingers(desired, desiredSpeed, &other, &otherSpeed, 1);
+        const float full = HIDPathStates::speedSymmetryAmongFingersInFull(desired, desiredSpeed, &other, &otherSpeed, 1);
+        if (bitsOf(fast) != bitsOf(full)) ++differences;
+        if (full != 0.0f) ++nonZero;
+        if (full < 0.0f) ++negative;
+    }
+    EXPECT_EQ(differences, 0);
+    EXPECT_GT(nonZero, 50000);
+    EXPECT_GT(negative, 10000);  // fingers moving apart, whose cosine is negative, were among them
 }
 
 }  // namespace
