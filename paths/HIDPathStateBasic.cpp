@@ -1,5 +1,6 @@
 #include "HIDPathStateBasic.h"
 
+#include <array>
 #include <cmath>
 
 #include "filter/FilterLogging.h"
@@ -118,7 +119,16 @@ int HIDPathStateBasic::countFingersOnDivingButton() {
     numNonEdgeTouches_ = 0;
     numTouches_ = 0;
     numPalms_ = 0;
-    forEachPathByID([this](const HIDParserPath* path, int) {
+    // The paths are gathered in the first walk and looked at again from the list: nothing
+    // between the two looks changes a path.
+    struct Found {
+        const HIDParserPath* path;
+        int id;
+    };
+    std::array<Found, kNumPaths> found;
+    size_t numFound = 0;
+    forEachPathByID([&](const HIDParserPath* path, int id) {
+        found[numFound++] = Found{path, id};
         const bool touchingFinger = path->isTouching() && path->isFingerOrRestingContact();
         if (touchingFinger && !path->isEdgeContact()) ++numNonEdgeTouches_;
         if (touchingFinger) ++numTouches_;
@@ -130,7 +140,11 @@ int HIDPathStateBasic::countFingersOnDivingButton() {
     float secondScore = kNoBottomScore_mm;
     int bestID = 0;
     int secondID = 0;
-    forEachPathByID([&](const HIDParserPath* path, int id) {
+    const HIDParserPath* best = nullptr;
+    const HIDParserPath* second = nullptr;
+    for (size_t k = 0; k < numFound; ++k) {
+        const HIDParserPath* path = found[k].path;
+        const int id = found[k].id;
         // Asked first, so the edge test of every path runs only for the diagnostics.
         if (verboseDebugEnabled()) {
             logVerbose("%s [parserPath isEdgeContact] %d _numNonEdgeTouches %d [parserPath isTouching] %d "
@@ -141,31 +155,34 @@ int HIDPathStateBasic::countFingersOnDivingButton() {
         // An edge-only palm-type contact counts only while at most one non-edge finger touches.
         const bool takesPart = path->isTouching() && (path->isFingerOrRestingContact() ||
                                                       (path->isEdgeContact() && numNonEdgeTouches_ <= 1));
-        if (!takesPart) return;
+        if (!takesPart) continue;
         const float score = path->currentContact().position.y - path->peakDisplacement();
         logVerbose("%s in here bottom_most_pidx %d peakdisplacement %f ypos_plus %f bottom_most_y_mm%f", kSignature,
                    bestID, path->peakDisplacement(), score, bestScore);
         if (score > bestScore) {
             secondScore = bestScore;
             secondID = bestID;
+            second = best;
             bestScore = score;
             bestID = id;
+            best = path;
         } else if (score > secondScore) {
             secondScore = score;
             secondID = id;
+            second = path;
         }
-    });
+    }
     bottomDivingPathIndex_ = bestID;
 
     numFingersOnDivingButton_ = 0;
     numEdgeTouchesOnDivingButton_ = 0;
     if (bottomDivingPathIndex_ != 0) {
-        const HIDParserPath* best = getParserPathforPathID(bottomDivingPathIndex_);
+        // The paths the walk found for these IDs, as looking them up again would find them.
         if (best && best->isContactOnDivingButton()) {
             numFingersOnDivingButton_ = 1;
             if (best->isEdgeContact()) numEdgeTouchesOnDivingButton_ = 1;
         }
-        const HIDParserPath* second = secondID != 0 ? getParserPathforPathID(secondID) : nullptr;
+        if (secondID == 0) second = nullptr;
         if (best && second && numFingersOnDivingButton_ >= 1) {
             const HIDPoint b = best->currentContact().position;
             const HIDPoint s = second->currentContact().position;

@@ -216,9 +216,10 @@ void HIDPathStates::checkForRestingThumb() {
 void HIDPathStates::updateSpeedSymmetriesOfAllPaths() {
     // The touching fingers are gathered once; each one's symmetry is then worked out against
     // the others of the same list, which is what asking every path in turn would gather.
-    std::array<HIDParserPath*, kMaxPaths> fingers{};
-    std::array<HIDPoint, kMaxPaths> velocities{};
-    std::array<float, kMaxPaths> speeds{};
+    // Only the entries written are read, so none is set beforehand.
+    std::array<HIDParserPath*, kMaxPaths> fingers;
+    std::array<HIDPoint, kMaxPaths> velocities;
+    std::array<float, kMaxPaths> speeds;
     size_t numFingers = 0;
     forEachPathByID([&](HIDParserPath* path, int id) {
         if (path->currentContact().path_id == id && path->isFingerOrRestingContact() && path->isTouching()) {
@@ -231,8 +232,8 @@ void HIDPathStates::updateSpeedSymmetriesOfAllPaths() {
         }
     });
 
-    std::array<HIDPoint, kMaxPaths> otherVelocities{};
-    std::array<float, kMaxPaths> otherSpeeds{};
+    std::array<HIDPoint, kMaxPaths> otherVelocities;
+    std::array<float, kMaxPaths> otherSpeeds;
     for (size_t k = 0; k < numFingers; ++k) {
         size_t numOthers = 0;
         for (size_t j = 0; j < numFingers; ++j) {

@@ -62,20 +62,6 @@ void HIDParserPath::updateCurPrevContactsWith(const HIDEvent& contact, double ti
     updatePathStageTimestamps(time);
 }
 
-bool HIDParserPath::isContactOnDivingButton() const {
-    return currentContact_.position.y > surfaceDimensions_.y * 0.5;
-}
-
-bool HIDParserPath::isEdgeContact() const {
-    const float w = surfaceDimensions_.x;
-    const float h = surfaceDimensions_.y;
-    const float x = currentContact_.position.x;
-    const float y = currentContact_.position.y;
-    // The band is one fifth wide at the left, right and top and one quarter at the bottom, on purpose.
-    const bool inside = w / 5 < x && x < w * 4 / 5 && h * 0.25 < y && y < h * 4 / 5;
-    return !inside;
-}
-
 void HIDParserPath::setRestingContact(bool resting) { isResting_ = resting; }
 
 void HIDParserPath::setRestingInThumbZone(bool resting) {
@@ -212,13 +198,6 @@ bool HIDParserPath::fingerLiftoffNearEdgeframeInterval() const {
                                                 static_cast<double>(previousContact_.position.y));
     // Heading out through the bottom quarter of the surface.
     return predictedY <= surfaceDimensions_.y * 0.25;
-}
-
-HIDPoint HIDParserPath::getAverageVelocity_mm_s() const {
-    return HIDPoint{
-        static_cast<float>(0.5 * previousContact_.velocity.x + 0.5 * currentContact_.velocity.x),
-        static_cast<float>(0.5 * previousContact_.velocity.y + 0.5 * currentContact_.velocity.y),
-    };
 }
 
 void HIDParserPath::clear() {

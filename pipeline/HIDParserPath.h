@@ -56,8 +56,16 @@ public:
     bool isFingerContact() const { return !isRestingInThumbZone_ && isFingerOrRestingContact(); }
     // Reports the thumb-zone flag of the last frame, on purpose.
     bool wasResting() const { return wasRestingInThumbZone_; }
-    bool isContactOnDivingButton() const;
-    bool isEdgeContact() const;
+    bool isContactOnDivingButton() const { return currentContact_.position.y > surfaceDimensions_.y * 0.5; }
+    bool isEdgeContact() const {
+        const float w = surfaceDimensions_.x;
+        const float h = surfaceDimensions_.y;
+        const float x = currentContact_.position.x;
+        const float y = currentContact_.position.y;
+        // The band is one fifth wide at the left, right and top and one quarter at the bottom, on purpose.
+        const bool inside = w / 5 < x && x < w * 4 / 5 && h * 0.25 < y && y < h * 4 / 5;
+        return !inside;
+    }
 
     void setRestingContact(bool resting);
     // Copies the flag into wasRestingInThumbZone first, then sets it.
@@ -118,7 +126,12 @@ public:
     void updateDampedVelocity(bool strongDamping);
     void weakenDampedVelocity(float factor);
     bool fingerLiftoffNearEdgeframeInterval() const;
-    HIDPoint getAverageVelocity_mm_s() const;
+    HIDPoint getAverageVelocity_mm_s() const {
+        return HIDPoint{
+            static_cast<float>(0.5 * previousContact_.velocity.x + 0.5 * currentContact_.velocity.x),
+            static_cast<float>(0.5 * previousContact_.velocity.y + 0.5 * currentContact_.velocity.y),
+        };
+    }
     void clear();
     static void clearTimestamps(HIDPathTimestamps& timestamps);
 
