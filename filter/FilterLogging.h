@@ -1,6 +1,8 @@
 #pragma once
 // The plug-in's two log handles and its internal-build test, shared by every class.
 
+#include <atomic>
+
 #include "platform/Logging.h"
 
 #define ORVANE_EXPORT __attribute__((visibility("default")))
@@ -19,10 +21,17 @@ ORVANE_EXPORT bool _isInternalBuild(void);
 
 namespace orvane {
 
-// _isInternalBuild's answer, kept here after the first call.
+// _isInternalBuild's answer, kept here after the first call (-1 until then). Asked on every
+// frame, so it is one plain load; two threads that ask at once both get the one answer
+// _isInternalBuild keeps.
+inline std::atomic<int> internalBuildAnswer{-1};
 inline bool internalBuild() {
-    static const bool internal = _isInternalBuild();
-    return internal;
+    int answer = internalBuildAnswer.load(std::memory_order_relaxed);
+    if (answer < 0) [[unlikely]] {
+        answer = _isInternalBuild() ? 1 : 0;
+        internalBuildAnswer.store(answer, std::memory_order_relaxed);
+    }
+    return answer != 0;
 }
 
 // Per-frame diagnostics run only on an internal build with the verbose handle at debug level.

@@ -24,7 +24,8 @@ float lengthOf(HIDPoint p) { return sqrtf(p.x * p.x + p.y * p.y); }
 
 }  // namespace
 
-HIDParserPath::HIDParserPath(float height, float width) : surfaceDimensions_{width, height} {}
+HIDParserPath::HIDParserPath(float height, float width)
+    : surfaceDimensions_{width, height}, bounds_(EdgeBounds::of(surfaceDimensions_)) {}
 
 void HIDParserPath::updateCurPrevContactsWith(const HIDEvent& contact, double time) {
     link_.markDirty();

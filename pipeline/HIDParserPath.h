@@ -56,14 +56,11 @@ public:
     bool isFingerContact() const { return !isRestingInThumbZone_ && isFingerOrRestingContact(); }
     // Reports the thumb-zone flag of the last frame, on purpose.
     bool wasResting() const { return wasRestingInThumbZone_; }
-    bool isContactOnDivingButton() const { return currentContact_.position.y > surfaceDimensions_.y * 0.5; }
+    bool isContactOnDivingButton() const { return currentContact_.position.y > bounds_.divingButtonTop; }
     bool isEdgeContact() const {
-        const float w = surfaceDimensions_.x;
-        const float h = surfaceDimensions_.y;
         const float x = currentContact_.position.x;
         const float y = currentContact_.position.y;
-        // The band is one fifth wide at the left, right and top and one quarter at the bottom, on purpose.
-        const bool inside = w / 5 < x && x < w * 4 / 5 && h * 0.25 < y && y < h * 4 / 5;
+        const bool inside = bounds_.left < x && x < bounds_.right && bounds_.top < y && y < bounds_.bottom;
         return !inside;
     }
 
@@ -97,8 +94,7 @@ public:
     // ID, and skips clearing paths that are already clear. Each path it owns keeps its slot's
     // bits of `marks` up to date. nullptr unlinks the path.
     void linkToTable(int slot, HIDPathTableMarks* marks) {
-        link_.slot = slot;
-        link_.marks = marks;
+        link_.link(slot, marks);
         link_.noteID(currentContact_.path_id);
         link_.markDirty();
     }
@@ -144,7 +140,11 @@ public:
     HID_PROPERTY(float, _2F_speed_symmetry, set_2F_speed_symmetry)
     HID_CLEARED_PROPERTY(float, dampedSpeed, setDampedSpeed)
     float peakDisplacement() const { return peakDisplacement_; }
-    HID_PROPERTY(HIDPoint, surfaceDimensions, setSurfaceDimensions)
+    HIDPoint surfaceDimensions() const { return surfaceDimensions_; }
+    void setSurfaceDimensions(HIDPoint dimensions) {
+        surfaceDimensions_ = dimensions;
+        bounds_ = EdgeBounds::of(dimensions);
+    }
     HID_CLEARED_PROPERTY(HIDPoint, initialPosition, setInitialPosition)
     HID_CLEARED_PROPERTY(HIDPoint, longTermPosition, setLongTermPosition)
     HID_CLEARED_PROPERTY(HIDPoint, stablePositionForUI, setStablePositionForUI)
@@ -163,14 +163,21 @@ private:
     // The path's place in its table. A copy of a path belongs to no table; a path is never
     // assigned over.
     struct TableLink {
+        // A path in no table keeps its marks here, where nobody reads them.
+        HIDPathTableMarks spare;
+        HIDPathTableMarks* marks = &spare;
         int slot = -1;
-        HIDPathTableMarks* marks = nullptr;
+        // 1 << slot in a table, 0 outside one, so that marking changes nothing.
+        uint32_t bit = 0;
         TableLink() = default;
         TableLink(const TableLink&) {}
         TableLink& operator=(const TableLink&) = delete;
+        void link(int tableSlot, HIDPathTableMarks* tableMarks) {
+            slot = tableMarks ? tableSlot : -1;
+            marks = tableMarks ? tableMarks : &spare;
+            bit = tableMarks ? 1u << tableSlot : 0;
+        }
         void noteID(int32_t pathID) const {
-            if (!marks) return;
-            const uint32_t bit = 1u << slot;
             if (pathID == 0 || pathID == slot) {
                 marks->looseSlots &= ~bit;
             } else {
@@ -182,14 +189,22 @@ private:
                 marks->ownSlots &= ~bit;
             }
         }
-        void markLoose() const {
-            if (marks) marks->looseSlots |= 1u << slot;
-        }
-        void markDirty() const {
-            if (marks) marks->dirtySlots |= 1u << slot;
-        }
-        void markClear() const {
-            if (marks) marks->dirtySlots &= ~(1u << slot);
+        void markLoose() const { marks->looseSlots |= bit; }
+        void markDirty() const { marks->dirtySlots |= bit; }
+        void markClear() const { marks->dirtySlots &= ~bit; }
+    };
+
+    // The edge band and the diving button's upper limit, worked out from the surface size as
+    // the tests use them.
+    struct EdgeBounds {
+        float left, right, bottom;
+        double top, divingButtonTop;
+        static EdgeBounds of(HIDPoint surface) {
+            const float w = surface.x;
+            const float h = surface.y;
+            // The band is one fifth wide at the left, right and top and one quarter at the
+            // bottom, on purpose; the quarter and the half are worked out in double.
+            return EdgeBounds{w / 5, w * 4 / 5, h * 4 / 5, h * 0.25, h * 0.5};
         }
     };
 
@@ -206,6 +221,7 @@ private:
     float dampedSpeed_ = 0.0f;
     float peakDisplacement_ = 0.0f;
     HIDPoint surfaceDimensions_{};
+    EdgeBounds bounds_ = EdgeBounds::of(HIDPoint{});
     HIDPoint initialPosition_{};
     HIDPoint longTermPosition_{};
     HIDPoint stablePositionForUI_{};
