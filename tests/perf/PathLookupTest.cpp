@@ -12,7 +12,7 @@
 
 #include "paths/HIDPathStates.h"
 #include "pipeline/HIDParser.h"
-#include "tools/formats/FrameRecording.h"
+#include "PerfSessions.h"
 
 namespace orvane {
 namespace {
@@ -36,46 +36,16 @@ void compareForms(const HIDPathStateBasic& table, Agreement& agreement) {
     }
 }
 
-std::vector<std::string> randomSessions() {
-    std::vector<std::string> paths;
-    for (const auto& entry : std::filesystem::directory_iterator(ORVANE_PERF_RECORDINGS)) {
-        const std::string name = entry.path().filename().string();
-        if (name.rfind("random-", 0) == 0) paths.push_back(entry.path().string());
-    }
-    std::sort(paths.begin(), paths.end());
-    return paths;
-}
-
-float surfaceSide(const formats::FrameRecording& recording, const char* key) {
-    const PropertyValue* dimensions = nullptr;
-    const auto it = recording.header.service.properties.find("SurfaceDimensions");
-    if (it != recording.header.service.properties.end()) dimensions = &it->second;
-    const PropertyValue* side = dimensions ? dimensions->find(key) : nullptr;
-    // 16.16 fixed point, and the pipeline works in tenths of it.
-    return side ? static_cast<float>(side->int32Value() / 65536.0 * 10.0) : 100.0f;
-}
-
 TEST(PathLookup, DirectLookupAgreesWithTheSearchOnEveryFrameOfTheRandomSessions) {
-    const std::vector<std::string> sessions = randomSessions();
-    ASSERT_GE(sessions.size(), 8u) << "recordings unpacked into " << ORVANE_PERF_RECORDINGS;
-    for (const std::string& path : sessions) {
-        formats::FrameRecording recording;
-        std::string error;
-        ASSERT_TRUE(formats::readFrameRecordingFile(path, &recording, &error)) << error;
-        HIDParser parser([](const HIDEventRef&) {}, surfaceSide(recording, "Height"),
-                         surfaceSide(recording, "Width"));
-        Agreement agreement;
-        int frames = 0;
-        for (const formats::InputRecord& record : recording.records) {
-            if (record.kind != formats::InputRecord::Kind::Event) continue;
-            parser.handleContactFrame(static_cast<double>(record.event->timestamp()), record.event->copy());
-            compareForms(*parser.pathStates(), agreement);
-            ++frames;
-        }
-        EXPECT_EQ(agreement.differences, 0) << path;
-        // Fingers were found on most frames, so the agreement says something.
-        EXPECT_GT(agreement.found, frames) << path;
-    }
+    Agreement agreement;
+    int frames = 0;
+    perf::replayRandomSessions([&](HIDParser& parser, const HIDEventRef&) {
+        compareForms(*parser.pathStates(), agreement);
+        ++frames;
+    });
+    EXPECT_EQ(agreement.differences, 0);
+    // Fingers were found on most frames, so the agreement says something.
+    EXPECT_GT(agreement.found, frames);
 }
 
 TEST(PathLookup, DirectLookupAgreesWithTheSearchWhenContactsAreChangedFromOutside) {
