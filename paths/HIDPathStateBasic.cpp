@@ -36,16 +36,22 @@ HIDPathStateBasic::~HIDPathStateBasic() {
 
 bool HIDPathStateBasic::unpackContactFrame(const HIDEventRef& frame, double time) {
     updateFrameTimestamp(time);
-    clearExistingPathLiftoffsAndMasks(frame);
-    if (frame) expandAndFilterPackedContacts(frame);
+    if (frame) {
+        // Clearing paths leaves the frame as it is, so both steps see the same contact count.
+        const int numContacts = getNumberOfContacts(frame);
+        clearExistingPathLiftoffsAndMasks(numContacts);
+        expandAndFilterPackedContacts(*frame, numContacts);
+    }
     updateFastestFingerSpeed();
     return true;
 }
 
 void HIDPathStateBasic::clearExistingPathLiftoffsAndMasks(const HIDEventRef& frame) {
-    if (!frame) return;
-    // Clearing paths leaves the frame as it is, so its contact count is the same for every slot.
-    const bool noContacts = getNumberOfContacts(frame) == 0;
+    if (frame) clearExistingPathLiftoffsAndMasks(getNumberOfContacts(frame));
+}
+
+void HIDPathStateBasic::clearExistingPathLiftoffsAndMasks(int numContacts) {
+    const bool noContacts = numContacts == 0;
     // A path that is already clear stays as it is when cleared again, so only the others are
     // looked at; clearing one leaves the rest of the table's marks as they were.
     for (uint32_t bits = marks_.dirtySlots & ~1u; bits != 0; bits &= bits - 1) {
@@ -73,9 +79,12 @@ void HIDPathStateBasic::clearExistingPathLiftoffsAndMasksOneByOne(const HIDEvent
 
 void HIDPathStateBasic::expandAndFilterPackedContacts(const HIDEventRef& frame) {
     numNewContacts_ = 0;
-    if (!frame) return;
-    const int n = getNumberOfContacts(frame);
-    const std::vector<HIDEventRef>& children = frame->children();
+    if (frame) expandAndFilterPackedContacts(*frame, getNumberOfContacts(frame));
+}
+
+void HIDPathStateBasic::expandAndFilterPackedContacts(const HIDEvent& frame, int n) {
+    numNewContacts_ = 0;
+    const std::vector<HIDEventRef>& children = frame.children();
     for (int i = 0; i < n; ++i) {
         // Children are read by position, whatever their type.
         const HIDEvent& child = *children[static_cast<size_t>(i)];

@@ -124,6 +124,10 @@ public:
     HID_PROPERTY(unsigned int, currentlyTouchedZones, setCurrentlyTouchedZones)
 
 private:
+    // The two steps of unpacking, given the frame's contact count.
+    void clearExistingPathLiftoffsAndMasks(int numContacts);
+    void expandAndFilterPackedContacts(const HIDEvent& frame, int numContacts);
+
     static constexpr int kFirstSlot = 1;
     static constexpr int kLastSlot = 14;
 
