@@ -20,7 +20,10 @@ public:
 
     HIDFingerToPathMap() = default;
 
+    // Maps the paths found for IDs 1..14, visiting only the slots that can hold one.
     void updateFingerPathMappings(const HIDPathStateBasic& pathTable);
+    // The same, asking the table for every ID from 1 to 14 in turn.
+    void updateFingerPathMappingsOneByOne(const HIDPathStateBasic& pathTable);
     void clearFingerPathMappings();
     int32_t getPathIndexforFingerID(uint32_t fingerID, bool withResting) const;
     HIDParserPath* getInnermostTouchingPath(const HIDPathStateBasic& pathTable, bool withResting) const;
@@ -47,6 +50,9 @@ public:
     HID_PROPERTY(int32_t, outermostTouchingFingerIDWithResting, setOutermostTouchingFingerIDWithResting)
 
 private:
+    // Counts and maps one path found for an ID.
+    void mapPath(const HIDParserPath& path, int pathID);
+
     std::array<int32_t, kNumFingerIDs> fingersToPathIDs_{};
     std::array<int32_t, kNumFingerIDs> fingersToPathIDsWithResting_{};
     uint8_t numFingersTouching_ = 0;
