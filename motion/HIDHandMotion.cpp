@@ -94,6 +94,21 @@ HIDSeparationVector HIDHandMotion::computeSeparationVector(const HIDContact& inn
     return s;
 }
 
+HIDSeparationVector HIDHandMotion::computeSeparationVectorWithoutDirection(const HIDContact& innermostCurContact,
+                                                                          const HIDContact& outermostCurContact) {
+    HIDSeparationVector s{};
+    s.x = outermostCurContact.position.x - innermostCurContact.position.x;
+    s.y = outermostCurContact.position.y - innermostCurContact.position.y;
+    s.magnitude = getVectorMagnitudeX(s.x, s.y);
+    return s;
+}
+
+HIDMotion HIDHandMotion::absoluteLocation() const {
+    HIDMotion location = absoluteLocation_;
+    if (locationDirectionPending_) location.rotate = getVectorDirectionX(locationSeparation_.x, locationSeparation_.y);
+    return location;
+}
+
 void HIDHandMotion::computeSeparation_mm(const HIDContact& innermostCurContact,
                                          const HIDContact& outermostCurContact) {
     const float dx = outermostCurContact.position.x - innermostCurContact.position.x;
@@ -163,13 +178,16 @@ void HIDHandMotion::extractHandMotion(const HIDPathStates& pathTable, HIDParserP
     }
 
     if (formsPair(outermostPath, innerCur, outerCur)) {
-        const HIDSeparationVector s = computeSeparationVector(innerCur, outerCur);
+        // The direction goes into the location's rotate, worked out when that is read.
+        const HIDSeparationVector s = computeSeparationVectorWithoutDirection(innerCur, outerCur);
         const HIDPoint i = engagedVelocityOf(innermostPath);
         const HIDPoint o = outermostPath->engagedVelocity();
         computeSeparation_mm(innerCur, outerCur);
 
         absoluteLocation_.scale = s.magnitude;
-        absoluteLocation_.rotate = s.direction;
+        absoluteLocation_.rotate = 0.0f;
+        locationSeparation_ = HIDPoint{s.x, s.y};
+        locationDirectionPending_ = true;
         // The halvings below average with whatever the innermost finger left, also when it
         // left nothing: then they hold half the outermost value, on purpose.
         absoluteLocation_.x = (outerCur.position.x + absoluteLocation_.x) * 0.5f;
@@ -203,6 +221,7 @@ void HIDHandMotion::extractHandMotion(const HIDPathStates& pathTable, HIDParserP
     } else {
         absoluteLocation_.scale = 0.0f;
         absoluteLocation_.rotate = 0.0f;
+        locationDirectionPending_ = false;
     }
 
     speedSimilarity_ = pathTable.speedSimilarity();
@@ -225,7 +244,8 @@ void HIDHandMotion::extractHandMotionWithResting(const HIDPathStates&, HIDParser
     }
 
     if (formsPair(outermostPath, innerCur, outerCur)) {
-        const HIDSeparationVector s = computeSeparationVector(innerCur, outerCur);
+        // The direction is not needed here.
+        const HIDSeparationVector s = computeSeparationVectorWithoutDirection(innerCur, outerCur);
         if (s.magnitude > 0.0f && areTouching && wereTouching && isValid(innermostPath, innerPrev) &&
             isValid(outermostPath, outerPrev)) {
             const HIDPoint u{s.x / s.magnitude, s.y / s.magnitude};
@@ -442,6 +462,7 @@ void HIDHandMotion::resetAccumulateHandMotion() {
 void HIDHandMotion::clearHandMotion(bool clearLocation) {
     if (clearLocation) {
         clear2DPlaneMotion(absoluteLocation_);
+        locationDirectionPending_ = false;
         handCentroid_ = HIDPoint{0.0f, 0.0f};
         tLastPixelDelta_ = 0.0;
     }
