@@ -113,11 +113,15 @@ void HIDHandMotion::computeSeparation_mm(const HIDContact& innermostCurContact,
                                          const HIDContact& outermostCurContact) {
     const float dx = outermostCurContact.position.x - innermostCurContact.position.x;
     const float dy = outermostCurContact.position.y - innermostCurContact.position.y;
+    noteSeparation_mm(dy, getVectorMagnitudeX(dx, dy));
+}
+
+void HIDHandMotion::noteSeparation_mm(float dy, float magnitude) {
     innermostOutermostVerticalSeparation_mm_ = std::fabs(dy);
     if (innermostOutermostVerticalSeparation_mm_ > maxInnermostOutermostVerticalSeparation_mm_) {
         maxInnermostOutermostVerticalSeparation_mm_ = innermostOutermostVerticalSeparation_mm_;
     }
-    innermostOutermostSeparation_mm_ = getVectorMagnitudeX(dx, dy);
+    innermostOutermostSeparation_mm_ = magnitude;
 }
 
 float HIDHandMotion::scalingFromDotProduct(HIDPoint unitSeparation, HIDPoint innermostMotionV,
@@ -182,7 +186,8 @@ void HIDHandMotion::extractHandMotion(const HIDPathStates& pathTable, HIDParserP
         const HIDSeparationVector s = computeSeparationVectorWithoutDirection(innerCur, outerCur);
         const HIDPoint i = engagedVelocityOf(innermostPath);
         const HIDPoint o = outermostPath->engagedVelocity();
-        computeSeparation_mm(innerCur, outerCur);
+        // computeSeparation_mm(innerCur, outerCur), from the same difference and magnitude.
+        noteSeparation_mm(s.y, s.magnitude);
 
         absoluteLocation_.scale = s.magnitude;
         absoluteLocation_.rotate = 0.0f;
@@ -291,13 +296,21 @@ void HIDHandMotion::processHandMotion(HIDPathStates& pathTable, int32_t nTouchin
         bool wereTouching = inner != nullptr && inner->wasTouching() && outer != nullptr && outer->wasTouching();
         extractHandMotion(pathTable, inner, outer, areTouching, wereTouching);
 
-        HIDParserPath* innerResting = getInnermostTouchingPath(pathTable, true);
-        HIDParserPath* outerResting = getOutermostTouchingPath(pathTable, true);
-        areTouching = innerResting != nullptr && innerResting->isTouching() && outerResting != nullptr &&
-                      outerResting->isTouching();
-        wereTouching = innerResting != nullptr && innerResting->wasTouching() && outerResting != nullptr &&
-                       outerResting->wasTouching();
-        extractHandMotionWithResting(pathTable, innerResting, outerResting, areTouching, wereTouching);
+        if (innermostTouchingFingerIDWithResting() == innermostTouchingFingerID() &&
+            outermostTouchingFingerIDWithResting() == outermostTouchingFingerID()) {
+            // Both views map a finger to the same path, so the WithResting view picked the same
+            // two paths, and its extraction, the plain one's deltas under the same conditions,
+            // would give exactly the deltas just worked out.
+            pixelDeltasWithResting_ = pixelDeltas_;
+        } else {
+            HIDParserPath* innerResting = getInnermostTouchingPath(pathTable, true);
+            HIDParserPath* outerResting = getOutermostTouchingPath(pathTable, true);
+            areTouching = innerResting != nullptr && innerResting->isTouching() && outerResting != nullptr &&
+                          outerResting->isTouching();
+            wereTouching = innerResting != nullptr && innerResting->wasTouching() && outerResting != nullptr &&
+                           outerResting->wasTouching();
+            extractHandMotionWithResting(pathTable, innerResting, outerResting, areTouching, wereTouching);
+        }
 
         if (nTouching == 1 && pathTable.restingThumbExists()) {
             // One finger against the resting thumb, the bottom-most path.

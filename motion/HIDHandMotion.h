@@ -94,6 +94,9 @@ public:
     HID_PROPERTY(HIDMotion, velocity_mm_s, setVelocity_mm_s)
 
 private:
+    // The separations of computeSeparation_mm from the vertical difference and the magnitude.
+    void noteSeparation_mm(float dy, float magnitude);
+
     HIDMotion pixelDeltas_{};
     HIDMotion velocity_{};
     HIDMotion absoluteLocation_{};

@@ -3,6 +3,8 @@
 //   the table for every ID in turn, on every frame of the random sessions and on random
 //   tables with finger IDs repeated, out of range, in others' slots or none;
 // - the separation without its direction has the same x, y and magnitude as the full one;
+// - the WithResting extraction of the plain view's pair gives the plain deltas bit for bit,
+//   so a frame whose views picked the same pair shares them;
 // - the location's rotate, worked out when read, is bit for bit the direction the extraction
 //   gave (0 without a pair), through every way the location is set or cleared.
 
@@ -73,6 +75,10 @@ TEST(HandMotionForms, MapWalkAgreesWithEveryIDInTurnOnTheRandomSessions) {
     int differences = 0;
     int pairs = 0;
     int directionDifferences = 0;
+    int deltaDifferences = 0;
+    int withScale = 0;
+    int sameViews = 0;
+    int otherViews = 0;
     std::string first;
     perf::replayRandomSessions([&](HIDParser& parser, const HIDEventRef&) {
         ++frames;
@@ -91,19 +97,41 @@ TEST(HandMotionForms, MapWalkAgreesWithEveryIDInTurnOnTheRandomSessions) {
             if (!sameBits(motion.absoluteLocation().rotate, expected)) ++directionDifferences;
         }
 
-        // And an extraction from a copy, with both views' pairs.
+        // And extractions from a copy, with both views' pairs: the location's rotate, and the
+        // WithResting extraction of the same pair giving the plain one's deltas.
         for (bool withResting : {false, true}) {
-            HIDHandMotion copy = motion;
-            HIDParserPath* inner = copy.getInnermostTouchingPath(table, withResting);
-            HIDParserPath* outer = copy.getOutermostTouchingPath(table, withResting);
-            copy.extractHandMotion(table, inner, outer, true, true);
-            if (!sameBits(copy.absoluteLocation().rotate, directionReference(inner, outer))) ++directionDifferences;
+            for (int touching = 0; touching < 4; ++touching) {
+                HIDHandMotion copy = motion;
+                HIDParserPath* inner = copy.getInnermostTouchingPath(table, withResting);
+                HIDParserPath* outer = copy.getOutermostTouchingPath(table, withResting);
+                const bool are = (touching & 1) != 0;
+                const bool were = (touching & 2) != 0;
+                copy.extractHandMotion(table, inner, outer, are, were);
+                copy.extractHandMotionWithResting(table, inner, outer, are, were);
+                if (!sameBits(copy.absoluteLocation().rotate, directionReference(inner, outer))) {
+                    ++directionDifferences;
+                }
+                if (!sameBits(copy.pixelDeltas(), copy.pixelDeltasWithResting())) ++deltaDifferences;
+                if (copy.pixelDeltas().scale != 0.0f) ++withScale;
+            }
+        }
+        // The frame shared the plain deltas whenever both views had the same fingers.
+        if (motion.innermostTouchingFingerIDWithResting() == motion.innermostTouchingFingerID() &&
+            motion.outermostTouchingFingerIDWithResting() == motion.outermostTouchingFingerID()) {
+            ++sameViews;
+        } else {
+            ++otherViews;
         }
     });
     EXPECT_EQ(differences, 0) << first;
     EXPECT_EQ(directionDifferences, 0);
-    // Two or more fingers on many frames, so the agreement says something.
+    EXPECT_EQ(deltaDifferences, 0);
+    // Two or more fingers on many frames, so the agreement says something; and frames of
+    // both kinds, a resting thumb in one view only included.
     EXPECT_GT(pairs, frames / 10);
+    EXPECT_GT(withScale, frames / 10);
+    EXPECT_GT(sameViews, frames / 10);
+    EXPECT_GT(otherViews, 0) << "no frame had a resting thumb";
 }
 
 TEST(HandMotionForms, MapWalkAgreesWithEveryIDInTurnOnRandomTables) {
@@ -158,6 +186,47 @@ TEST(HandMotionForms, SeparationWithoutDirectionKeepsTheOtherParts) {
         }
     }
     EXPECT_EQ(differences, 0);
+}
+
+TEST(HandMotionForms, WithRestingExtractionOfThePlainPairGivesThePlainDeltas) {
+    std::mt19937 random(20261128);
+    auto pick = [&random](int low, int high) { return std::uniform_int_distribution<int>(low, high)(random); };
+    // Few distinct values, so equal positions, zero separations and -0 sums come up.
+    const float values[] = {0.0f, -0.0f, 0.5f, -1.25f, 3.0f, 7.75f, -20.0f, 1e-3f};
+    auto value = [&] { return values[static_cast<size_t>(pick(0, static_cast<int>(std::size(values)) - 1))]; };
+    HIDPathStates table(500.0f, 1000.0f);
+    HIDHandMotion motion;
+    int differences = 0;
+    int full = 0;
+    for (int step = 0; step < 50000; ++step) {
+        for (int s = 1; s <= 3; ++s) {
+            HIDParserPath* path = table.getParserPath(s);
+            HIDContact c{};
+            c.fingerTipSwitch = pick(0, 3) == 0 ? 0 : 1;
+            c.fingerConfidence = 1;
+            c.path_id = pick(0, 5) == 0 ? pick(0, 3) : s;
+            c.position = HIDPoint{value(), value()};
+            HIDContact p = c;
+            p.path_id = pick(0, 5) == 0 ? 0 : s;
+            p.position = HIDPoint{value(), value()};
+            path->setPreviousContact(p);
+            path->setCurrentContact(c);
+            path->setPixelDelta(HIDPoint{value(), value()});
+            path->setEngagedVelocity(HIDPoint{value(), value()});
+        }
+        HIDParserPath* inner = pick(0, 7) == 0 ? nullptr : table.getParserPath(pick(1, 3));
+        HIDParserPath* outer = pick(0, 7) == 0 ? nullptr : table.getParserPath(pick(1, 3));
+        const bool are = pick(0, 3) != 0;
+        const bool were = pick(0, 3) != 0;
+        motion.extractHandMotion(table, inner, outer, are, were);
+        motion.extractHandMotionWithResting(table, inner, outer, are, were);
+        if (!sameBits(motion.pixelDeltas(), motion.pixelDeltasWithResting())) {
+            if (differences++ == 0) ADD_FAILURE() << hex(motion.pixelDeltas()) << "vs " << hex(motion.pixelDeltasWithResting());
+        }
+        if (motion.pixelDeltas().scale != 0.0f) ++full;
+    }
+    EXPECT_EQ(differences, 0);
+    EXPECT_GT(full, 5000);
 }
 
 TEST(HandMotionForms, LocationDirectionFollowsEverySetAndClear) {
