@@ -11,9 +11,6 @@ namespace {
 constexpr int kFirstPathID = 1;
 constexpr int kLastPathID = 14;
 
-// The largest finger ID the maps hold; larger IDs are counted but not mapped.
-constexpr uint32_t kMaxMappedFingerID = HIDFingerToPathMap::kNumFingerIDs - 1;
-
 // Finger IDs are compared as unsigned numbers; 0 stands for no finger.
 inline uint32_t asFingerID(int32_t id) { return static_cast<uint32_t>(id); }
 
@@ -98,23 +95,6 @@ void HIDFingerToPathMap::mapPath(const HIDParserPath& path, int pathID) {
             outermostTouchingFingerIDWithResting_ = static_cast<int32_t>(fingerID);
         }
     }
-}
-
-int32_t HIDFingerToPathMap::getPathIndexforFingerID(uint32_t fingerID, bool withResting) const {
-    if (fingerID > kMaxMappedFingerID) return 0;
-    return withResting ? fingersToPathIDsWithResting_[fingerID] : fingersToPathIDs_[fingerID];
-}
-
-HIDParserPath* HIDFingerToPathMap::getInnermostTouchingPath(const HIDPathStateBasic& pathTable,
-                                                            bool withResting) const {
-    const int32_t fingerID = withResting ? innermostTouchingFingerIDWithResting_ : innermostTouchingFingerID_;
-    return pathTable.getParserPathforPathID(getPathIndexforFingerID(asFingerID(fingerID), withResting));
-}
-
-HIDParserPath* HIDFingerToPathMap::getOutermostTouchingPath(const HIDPathStateBasic& pathTable,
-                                                            bool withResting) const {
-    const int32_t fingerID = withResting ? outermostTouchingFingerIDWithResting_ : outermostTouchingFingerID_;
-    return pathTable.getParserPathforPathID(getPathIndexforFingerID(asFingerID(fingerID), withResting));
 }
 
 HIDParserPath* HIDFingerToPathMap::getNextInnermostTouchingPath(const HIDPathStateBasic& pathTable) const {
