@@ -8,7 +8,24 @@ namespace orvane {
 // The platform timebase, read on first use and kept for the process.
 TimebaseInfo cachedTimebase();
 
-// ticks × numerator / (denominator × 1,000,000), in double precision.
-double ticksToMilliseconds(double ticks);
+// The two factors of the conversion in double precision: the numerator, and the
+// denominator times 1,000,000.
+struct TickScale {
+    double numer;
+    double denomTimesMillion;
+};
+
+// The factors of the cached timebase.
+TickScale cachedTickScale();
+
+// ticks × numerator / (denominator × 1,000,000), in double precision: the same two steps
+// as ticksToMillisecondsFromTimebase, with the factors worked out once.
+inline double ticksToMilliseconds(double ticks) {
+    static const TickScale scale = cachedTickScale();
+    return ticks * scale.numer / scale.denomTimesMillion;
+}
+
+// The same conversion, reading the timebase and widening its parts on every call.
+double ticksToMillisecondsFromTimebase(double ticks);
 
 }  // namespace orvane

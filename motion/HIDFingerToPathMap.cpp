@@ -11,9 +11,6 @@ namespace {
 constexpr int kFirstPathID = 1;
 constexpr int kLastPathID = 14;
 
-// The largest finger ID the maps hold; larger IDs are counted but not mapped.
-constexpr uint32_t kMaxMappedFingerID = HIDFingerToPathMap::kNumFingerIDs - 1;
-
 // Finger IDs are compared as unsigned numbers; 0 stands for no finger.
 inline uint32_t asFingerID(int32_t id) { return static_cast<uint32_t>(id); }
 
@@ -36,77 +33,68 @@ void HIDFingerToPathMap::clearFingerPathMappings() {
 
 void HIDFingerToPathMap::updateFingerPathMappings(const HIDPathStateBasic& pathTable) {
     clearFingerPathMappings();
-
-    for (int pathID = kFirstPathID; pathID <= kLastPathID; ++pathID) {
-        const HIDParserPath* path = pathTable.getParserPathforPathID(pathID);
-        if (path == nullptr) continue;
-
-        const HIDContact& contact = path->currentContact();
-        if (contact.path_id != pathID) continue;
-
-        const uint32_t fingerID = asFingerID(contact.finger_id);
-        if (fingerID <= kMaxMappedFingerID) {
-            // A later path with the same finger ID takes the entry over.
-            fingersToPathIDs_[fingerID] = pathID;
-            fingersToPathIDsWithResting_[fingerID] = pathID;
-        }
-
-        if (path->isPalmContact()) {
-            numPalmContacts_ = static_cast<uint8_t>(numPalmContacts_ + 1);
-        } else if (path->isTouching() && !path->isRestingInThumbZone()) {
-            numFingersTouching_ = static_cast<uint8_t>(numFingersTouching_ + 1);
-
-            if (innermostTouchingFingerID_ == 0 || fingerID < asFingerID(innermostTouchingFingerID_)) {
-                nextInnermostTouchingFingerID_ = innermostTouchingFingerID_;
-                innermostTouchingFingerID_ = static_cast<int32_t>(fingerID);
-                handIdentity_ = 1;
-            } else if (nextInnermostTouchingFingerID_ == 0) {
-                // A finger that is not the new innermost never fills an empty next-innermost
-                // slot, on purpose: fingers met in ascending ID order leave it at 0.
-            } else if (fingerID < asFingerID(nextInnermostTouchingFingerID_)) {
-                nextInnermostTouchingFingerID_ = static_cast<int32_t>(fingerID);
-                handIdentity_ = 1;
-            }
-
-            if (outermostTouchingFingerID_ == 0 || fingerID > asFingerID(outermostTouchingFingerID_)) {
-                outermostTouchingFingerID_ = static_cast<int32_t>(fingerID);
-                handIdentity_ = 1;
-            }
-        }
-
-        // The WithResting view: every touching non-palm contact, a resting thumb included.
-        if (path->isTouching() && !path->isPalmContact()) {
-            // An 8-bit count that is never cleared, so it wraps past 255.
-            numFingersTouchingWithResting_ = static_cast<uint8_t>(numFingersTouchingWithResting_ + 1);
-            if (innermostTouchingFingerIDWithResting_ == 0 ||
-                fingerID < asFingerID(innermostTouchingFingerIDWithResting_)) {
-                innermostTouchingFingerIDWithResting_ = static_cast<int32_t>(fingerID);
-            }
-            if (outermostTouchingFingerIDWithResting_ == 0 ||
-                fingerID > asFingerID(outermostTouchingFingerIDWithResting_)) {
-                outermostTouchingFingerIDWithResting_ = static_cast<int32_t>(fingerID);
-            }
-        }
-    }
-
+    // Only the slots that can hold a contact are looked at, in the same ascending ID order.
+    pathTable.forEachPathByID([this](const HIDParserPath* path, int pathID) { mapPath(*path, pathID); });
     updateMaxFingersTouching();
 }
 
-int32_t HIDFingerToPathMap::getPathIndexforFingerID(uint32_t fingerID, bool withResting) const {
-    if (fingerID > kMaxMappedFingerID) return 0;
-    return withResting ? fingersToPathIDsWithResting_[fingerID] : fingersToPathIDs_[fingerID];
+void HIDFingerToPathMap::updateFingerPathMappingsOneByOne(const HIDPathStateBasic& pathTable) {
+    clearFingerPathMappings();
+    for (int pathID = kFirstPathID; pathID <= kLastPathID; ++pathID) {
+        const HIDParserPath* path = pathTable.getParserPathforPathID(pathID);
+        if (path == nullptr) continue;
+        mapPath(*path, pathID);
+    }
+    updateMaxFingersTouching();
 }
 
-HIDParserPath* HIDFingerToPathMap::getInnermostTouchingPath(const HIDPathStateBasic& pathTable,
-                                                            bool withResting) const {
-    const int32_t fingerID = withResting ? innermostTouchingFingerIDWithResting_ : innermostTouchingFingerID_;
-    return pathTable.getParserPathforPathID(getPathIndexforFingerID(asFingerID(fingerID), withResting));
-}
+void HIDFingerToPathMap::mapPath(const HIDParserPath& path, int pathID) {
+    const HIDContact& contact = path.currentContact();
+    if (contact.path_id != pathID) return;
 
-HIDParserPath* HIDFingerToPathMap::getOutermostTouchingPath(const HIDPathStateBasic& pathTable,
-                                                            bool withResting) const {
-    const int32_t fingerID = withResting ? outermostTouchingFingerIDWithResting_ : outermostTouchingFingerID_;
-    return pathTable.getParserPathforPathID(getPathIndexforFingerID(asFingerID(fingerID), withResting));
+    const uint32_t fingerID = asFingerID(contact.finger_id);
+    if (fingerID <= kMaxMappedFingerID) {
+        // A later path with the same finger ID takes the entry over.
+        fingersToPathIDs_[fingerID] = pathID;
+        fingersToPathIDsWithResting_[fingerID] = pathID;
+    }
+
+    if (path.isPalmContact()) {
+        numPalmContacts_ = static_cast<uint8_t>(numPalmContacts_ + 1);
+    } else if (path.isTouching() && !path.isRestingInThumbZone()) {
+        numFingersTouching_ = static_cast<uint8_t>(numFingersTouching_ + 1);
+
+        if (innermostTouchingFingerID_ == 0 || fingerID < asFingerID(innermostTouchingFingerID_)) {
+            nextInnermostTouchingFingerID_ = innermostTouchingFingerID_;
+            innermostTouchingFingerID_ = static_cast<int32_t>(fingerID);
+            handIdentity_ = 1;
+        } else if (nextInnermostTouchingFingerID_ == 0) {
+            // A finger that is not the new innermost never fills an empty next-innermost
+            // slot, on purpose: fingers met in ascending ID order leave it at 0.
+        } else if (fingerID < asFingerID(nextInnermostTouchingFingerID_)) {
+            nextInnermostTouchingFingerID_ = static_cast<int32_t>(fingerID);
+            handIdentity_ = 1;
+        }
+
+        if (outermostTouchingFingerID_ == 0 || fingerID > asFingerID(outermostTouchingFingerID_)) {
+            outermostTouchingFingerID_ = static_cast<int32_t>(fingerID);
+            handIdentity_ = 1;
+        }
+    }
+
+    // The WithResting view: every touching non-palm contact, a resting thumb included.
+    if (path.isTouching() && !path.isPalmContact()) {
+        // An 8-bit count that is never cleared, so it wraps past 255.
+        numFingersTouchingWithResting_ = static_cast<uint8_t>(numFingersTouchingWithResting_ + 1);
+        if (innermostTouchingFingerIDWithResting_ == 0 ||
+            fingerID < asFingerID(innermostTouchingFingerIDWithResting_)) {
+            innermostTouchingFingerIDWithResting_ = static_cast<int32_t>(fingerID);
+        }
+        if (outermostTouchingFingerIDWithResting_ == 0 ||
+            fingerID > asFingerID(outermostTouchingFingerIDWithResting_)) {
+            outermostTouchingFingerIDWithResting_ = static_cast<int32_t>(fingerID);
+        }
+    }
 }
 
 HIDParserPath* HIDFingerToPathMap::getNextInnermostTouchingPath(const HIDPathStateBasic& pathTable) const {

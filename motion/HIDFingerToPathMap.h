@@ -7,24 +7,37 @@
 #include <cstdint>
 
 #include "common/HIDTypes.h"
+#include "paths/HIDPathStateBasic.h"
 #include "pipeline/HIDTimeState.h"
 
 namespace orvane {
 
-class HIDParserPath;
-class HIDPathStateBasic;
-
 class HIDFingerToPathMap : public HIDTimeState {
 public:
     static constexpr int kNumFingerIDs = 16;
+    // The largest finger ID the maps hold; larger IDs are counted but not mapped.
+    static constexpr uint32_t kMaxMappedFingerID = kNumFingerIDs - 1;
 
     HIDFingerToPathMap() = default;
 
+    // Maps the paths found for IDs 1..14, visiting only the slots that can hold one.
     void updateFingerPathMappings(const HIDPathStateBasic& pathTable);
+    // The same, asking the table for every ID from 1 to 14 in turn.
+    void updateFingerPathMappingsOneByOne(const HIDPathStateBasic& pathTable);
     void clearFingerPathMappings();
-    int32_t getPathIndexforFingerID(uint32_t fingerID, bool withResting) const;
-    HIDParserPath* getInnermostTouchingPath(const HIDPathStateBasic& pathTable, bool withResting) const;
-    HIDParserPath* getOutermostTouchingPath(const HIDPathStateBasic& pathTable, bool withResting) const;
+    int32_t getPathIndexforFingerID(uint32_t fingerID, bool withResting) const {
+        if (fingerID > kMaxMappedFingerID) return 0;
+        return withResting ? fingersToPathIDsWithResting_[fingerID] : fingersToPathIDs_[fingerID];
+    }
+    // Inline, as the motion stage asks for these on every frame.
+    HIDParserPath* getInnermostTouchingPath(const HIDPathStateBasic& pathTable, bool withResting) const {
+        const int32_t fingerID = withResting ? innermostTouchingFingerIDWithResting_ : innermostTouchingFingerID_;
+        return pathTable.getParserPathforPathID(getPathIndexforFingerID(static_cast<uint32_t>(fingerID), withResting));
+    }
+    HIDParserPath* getOutermostTouchingPath(const HIDPathStateBasic& pathTable, bool withResting) const {
+        const int32_t fingerID = withResting ? outermostTouchingFingerIDWithResting_ : outermostTouchingFingerID_;
+        return pathTable.getParserPathforPathID(getPathIndexforFingerID(static_cast<uint32_t>(fingerID), withResting));
+    }
     HIDParserPath* getNextInnermostTouchingPath(const HIDPathStateBasic& pathTable) const;
     bool innermostOrOutermostIsThumb() const;
     void updateMaxFingersTouching();
@@ -47,6 +60,9 @@ public:
     HID_PROPERTY(int32_t, outermostTouchingFingerIDWithResting, setOutermostTouchingFingerIDWithResting)
 
 private:
+    // Counts and maps one path found for an ID.
+    void mapPath(const HIDParserPath& path, int pathID);
+
     std::array<int32_t, kNumFingerIDs> fingersToPathIDs_{};
     std::array<int32_t, kNumFingerIDs> fingersToPathIDsWithResting_{};
     uint8_t numFingersTouching_ = 0;

@@ -94,15 +94,34 @@ HIDSeparationVector HIDHandMotion::computeSeparationVector(const HIDContact& inn
     return s;
 }
 
+HIDSeparationVector HIDHandMotion::computeSeparationVectorWithoutDirection(const HIDContact& innermostCurContact,
+                                                                          const HIDContact& outermostCurContact) {
+    HIDSeparationVector s{};
+    s.x = outermostCurContact.position.x - innermostCurContact.position.x;
+    s.y = outermostCurContact.position.y - innermostCurContact.position.y;
+    s.magnitude = getVectorMagnitudeX(s.x, s.y);
+    return s;
+}
+
+HIDMotion HIDHandMotion::absoluteLocation() const {
+    HIDMotion location = absoluteLocation_;
+    if (locationDirectionPending_) location.rotate = getVectorDirectionX(locationSeparation_.x, locationSeparation_.y);
+    return location;
+}
+
 void HIDHandMotion::computeSeparation_mm(const HIDContact& innermostCurContact,
                                          const HIDContact& outermostCurContact) {
     const float dx = outermostCurContact.position.x - innermostCurContact.position.x;
     const float dy = outermostCurContact.position.y - innermostCurContact.position.y;
+    noteSeparation_mm(dy, getVectorMagnitudeX(dx, dy));
+}
+
+void HIDHandMotion::noteSeparation_mm(float dy, float magnitude) {
     innermostOutermostVerticalSeparation_mm_ = std::fabs(dy);
     if (innermostOutermostVerticalSeparation_mm_ > maxInnermostOutermostVerticalSeparation_mm_) {
         maxInnermostOutermostVerticalSeparation_mm_ = innermostOutermostVerticalSeparation_mm_;
     }
-    innermostOutermostSeparation_mm_ = getVectorMagnitudeX(dx, dy);
+    innermostOutermostSeparation_mm_ = magnitude;
 }
 
 float HIDHandMotion::scalingFromDotProduct(HIDPoint unitSeparation, HIDPoint innermostMotionV,
@@ -163,13 +182,17 @@ void HIDHandMotion::extractHandMotion(const HIDPathStates& pathTable, HIDParserP
     }
 
     if (formsPair(outermostPath, innerCur, outerCur)) {
-        const HIDSeparationVector s = computeSeparationVector(innerCur, outerCur);
+        // The direction goes into the location's rotate, worked out when that is read.
+        const HIDSeparationVector s = computeSeparationVectorWithoutDirection(innerCur, outerCur);
         const HIDPoint i = engagedVelocityOf(innermostPath);
         const HIDPoint o = outermostPath->engagedVelocity();
-        computeSeparation_mm(innerCur, outerCur);
+        // computeSeparation_mm(innerCur, outerCur), from the same difference and magnitude.
+        noteSeparation_mm(s.y, s.magnitude);
 
         absoluteLocation_.scale = s.magnitude;
-        absoluteLocation_.rotate = s.direction;
+        absoluteLocation_.rotate = 0.0f;
+        locationSeparation_ = HIDPoint{s.x, s.y};
+        locationDirectionPending_ = true;
         // The halvings below average with whatever the innermost finger left, also when it
         // left nothing: then they hold half the outermost value, on purpose.
         absoluteLocation_.x = (outerCur.position.x + absoluteLocation_.x) * 0.5f;
@@ -203,6 +226,7 @@ void HIDHandMotion::extractHandMotion(const HIDPathStates& pathTable, HIDParserP
     } else {
         absoluteLocation_.scale = 0.0f;
         absoluteLocation_.rotate = 0.0f;
+        locationDirectionPending_ = false;
     }
 
     speedSimilarity_ = pathTable.speedSimilarity();
@@ -225,7 +249,8 @@ void HIDHandMotion::extractHandMotionWithResting(const HIDPathStates&, HIDParser
     }
 
     if (formsPair(outermostPath, innerCur, outerCur)) {
-        const HIDSeparationVector s = computeSeparationVector(innerCur, outerCur);
+        // The direction is not needed here.
+        const HIDSeparationVector s = computeSeparationVectorWithoutDirection(innerCur, outerCur);
         if (s.magnitude > 0.0f && areTouching && wereTouching && isValid(innermostPath, innerPrev) &&
             isValid(outermostPath, outerPrev)) {
             const HIDPoint u{s.x / s.magnitude, s.y / s.magnitude};
@@ -271,13 +296,21 @@ void HIDHandMotion::processHandMotion(HIDPathStates& pathTable, int32_t nTouchin
         bool wereTouching = inner != nullptr && inner->wasTouching() && outer != nullptr && outer->wasTouching();
         extractHandMotion(pathTable, inner, outer, areTouching, wereTouching);
 
-        HIDParserPath* innerResting = getInnermostTouchingPath(pathTable, true);
-        HIDParserPath* outerResting = getOutermostTouchingPath(pathTable, true);
-        areTouching = innerResting != nullptr && innerResting->isTouching() && outerResting != nullptr &&
-                      outerResting->isTouching();
-        wereTouching = innerResting != nullptr && innerResting->wasTouching() && outerResting != nullptr &&
-                       outerResting->wasTouching();
-        extractHandMotionWithResting(pathTable, innerResting, outerResting, areTouching, wereTouching);
+        if (innermostTouchingFingerIDWithResting() == innermostTouchingFingerID() &&
+            outermostTouchingFingerIDWithResting() == outermostTouchingFingerID()) {
+            // Both views map a finger to the same path, so the WithResting view picked the same
+            // two paths, and its extraction, the plain one's deltas under the same conditions,
+            // would give exactly the deltas just worked out.
+            pixelDeltasWithResting_ = pixelDeltas_;
+        } else {
+            HIDParserPath* innerResting = getInnermostTouchingPath(pathTable, true);
+            HIDParserPath* outerResting = getOutermostTouchingPath(pathTable, true);
+            areTouching = innerResting != nullptr && innerResting->isTouching() && outerResting != nullptr &&
+                          outerResting->isTouching();
+            wereTouching = innerResting != nullptr && innerResting->wasTouching() && outerResting != nullptr &&
+                           outerResting->wasTouching();
+            extractHandMotionWithResting(pathTable, innerResting, outerResting, areTouching, wereTouching);
+        }
 
         if (nTouching == 1 && pathTable.restingThumbExists()) {
             // One finger against the resting thumb, the bottom-most path.
@@ -442,6 +475,7 @@ void HIDHandMotion::resetAccumulateHandMotion() {
 void HIDHandMotion::clearHandMotion(bool clearLocation) {
     if (clearLocation) {
         clear2DPlaneMotion(absoluteLocation_);
+        locationDirectionPending_ = false;
         handCentroid_ = HIDPoint{0.0f, 0.0f};
         tLastPixelDelta_ = 0.0;
     }

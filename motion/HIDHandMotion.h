@@ -30,6 +30,9 @@ public:
     static float getVectorDotProduct(HIDPoint a, float unitVectorBdirection);
     static HIDSeparationVector computeSeparationVector(const HIDContact& innermostCurContact,
                                                       const HIDContact& outermostCurContact);
+    // The same x, y and magnitude, with the direction left at 0 (for callers that never read it).
+    static HIDSeparationVector computeSeparationVectorWithoutDirection(const HIDContact& innermostCurContact,
+                                                                      const HIDContact& outermostCurContact);
     void computeSeparation_mm(const HIDContact& innermostCurContact, const HIDContact& outermostCurContact);
     static float scalingFromDotProduct(HIDPoint unitSeparation, HIDPoint innermostMotionV, HIDPoint outermostMotionV);
     static float rotationFromVectorProduct(HIDPoint unitSeparation, HIDPoint innermostMotionV,
@@ -61,7 +64,14 @@ public:
 
     HID_PROPERTY(HIDMotion, pixelDeltas, setPixelDeltas)
     HID_PROPERTY(HIDMotion, velocity, setVelocity)
-    HID_PROPERTY(HIDMotion, absoluteLocation, setAbsoluteLocation)
+    // The hand's location: x and y, the innermost-outermost separation in scale and its
+    // direction in rotate. The direction is worked out when the location is read, from the
+    // separation kept by the extraction, as nothing on the frame path reads it.
+    HIDMotion absoluteLocation() const;
+    void setAbsoluteLocation(HIDMotion value) {
+        absoluteLocation_ = value;
+        locationDirectionPending_ = false;
+    }
     HID_PROPERTY(float, innermostOutermostSeparation_mm, setInnermostOutermostSeparation_mm)
     HID_PROPERTY(float, innermostOutermostVerticalSeparation_mm, setInnermostOutermostVerticalSeparation_mm)
     HID_PROPERTY(float, maxInnermostOutermostVerticalSeparation_mm, setMaxInnermostOutermostVerticalSeparation_mm)
@@ -84,9 +94,15 @@ public:
     HID_PROPERTY(HIDMotion, velocity_mm_s, setVelocity_mm_s)
 
 private:
+    // The separations of computeSeparation_mm from the vertical difference and the magnitude.
+    void noteSeparation_mm(float dy, float magnitude);
+
     HIDMotion pixelDeltas_{};
     HIDMotion velocity_{};
     HIDMotion absoluteLocation_{};
+    // While pending, absoluteLocation_.rotate stands for the direction of this separation.
+    HIDPoint locationSeparation_{};
+    bool locationDirectionPending_ = false;
     float innermostOutermostSeparation_mm_ = 0.0f;
     float innermostOutermostVerticalSeparation_mm_ = 0.0f;
     float maxInnermostOutermostVerticalSeparation_mm_ = 0.0f;

@@ -10,15 +10,15 @@ constexpr int kLastPathID = 14;
 }  // namespace
 
 bool HIDHandStatistics::processHandState(const HIDPathStates& pathStates) {
-    // The statistics' clock follows the path table's.
-    updateFrameTimestamp(pathStates.currentTimestamp());
-    clear(true);
+    beginFrame(pathStates);
+    // Only the slots that can hold a contact are looked at, in the same ascending ID order.
+    pathStates.forEachPathByID([this](const HIDParserPath* path, int id) { countPath(*path, id); });
+    updateCumulativeMaxStats();
+    return numPaths_ > 0;
+}
 
-    // A change is time-stamped one frame after it is read, like the path table's; intended.
-    if (lastButtonState_ != currentButtonState_) t_recentButtonActivity_ = currentTimestamp();
-    lastButtonState_ = currentButtonState_;
-    currentButtonState_ = pathStates.buttonState();
-
+bool HIDHandStatistics::processHandStateOneByOne(const HIDPathStates& pathStates) {
+    beginFrame(pathStates);
     for (int id = kFirstPathID; id <= kLastPathID; ++id) {
         const HIDParserPath* path = pathStates.getParserPathforPathID(id);
         if (!path || path->currentContact().path_id != id) continue;
@@ -34,6 +34,31 @@ bool HIDHandStatistics::processHandState(const HIDPathStates& pathStates) {
     }
     updateCumulativeMaxStats();
     return numPaths_ > 0;
+}
+
+void HIDHandStatistics::beginFrame(const HIDPathStates& pathStates) {
+    // The statistics' clock follows the path table's.
+    updateFrameTimestamp(pathStates.currentTimestamp());
+    clear(true);
+
+    // A change is time-stamped one frame after it is read, like the path table's; intended.
+    if (lastButtonState_ != currentButtonState_) t_recentButtonActivity_ = currentTimestamp();
+    lastButtonState_ = currentButtonState_;
+    currentButtonState_ = pathStates.buttonState();
+}
+
+void HIDHandStatistics::countPath(const HIDParserPath& path, int id) {
+    if (path.currentContact().path_id != id) return;
+    updateStatsWithPath(path);
+    if (path.isFingerOrRestingContact()) {
+        const bool isTouching = path.isTouching();
+        // The lift-off edge test answers false for a touching path, so it is asked only of
+        // the others; the timestamps are read in place.
+        updateStatsWithFingerPath(id, path.currentContact().position, path.timestamps(), isTouching,
+                                  path.wasTouching() && path.wasFingerOrRestingContact(),
+                                  path.isRestingInThumbZone(), path.wasResting(),
+                                  !isTouching && path.fingerLiftoffNearEdgeframeInterval());
+    }
 }
 
 void HIDHandStatistics::updateStatsWithPath(const HIDParserPath& path) {

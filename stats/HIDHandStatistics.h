@@ -15,7 +15,11 @@ class HIDHandStatistics : public HIDTimeState {
 public:
     HIDHandStatistics() = default;
 
+    // The frame's statistics from the paths found for IDs 1..14, visiting only the slots
+    // that can hold one. True when there is any path.
     bool processHandState(const HIDPathStates& pathStates);
+    // The same, asking the table for every ID from 1 to 14 in turn.
+    bool processHandStateOneByOne(const HIDPathStates& pathStates);
     void updateStatsWithPath(const HIDParserPath& path);
     void updateStatsWithFingerPath(int pathID, HIDPoint contactLoc, const HIDPathTimestamps& timestamps,
                                    bool isTouching, bool wasTouching, bool isResting, bool wasResting,
@@ -86,6 +90,11 @@ public:
     HID_PROPERTY(HIDPoint, recentFingerLiftoffLocation, setRecentFingerLiftoffLocation)
 
 private:
+    // The clock, the per-frame clear and the button state, before the paths are counted.
+    void beginFrame(const HIDPathStates& pathStates);
+    // Counts one path found for an ID.
+    void countPath(const HIDParserPath& path, int id);
+
     bool engagedinGesture_ = false;
     bool twoFingersClose_ = false;
     bool palmsRemoved_ = false;
