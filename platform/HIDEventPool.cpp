@@ -120,7 +120,7 @@ std::shared_ptr<HIDEvent> HIDEventPool::make(uint32_t type, uint64_t timestamp, 
         event->timestamp_ = timestamp;
     } else {
         event = new HIDEvent(type, timestamp, options);
-        event->fields_.reserve(kInitialFields);
+        event->list_.reserve(kInitialFields);
         event->children_.reserve(kInitialChildren);
     }
     return std::shared_ptr<HIDEvent>(event, Recycler{}, HIDEventBlockAllocator<HIDEvent>{});
