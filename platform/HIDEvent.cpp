@@ -83,8 +83,23 @@ void HIDEvent::resetForPool() noexcept {
     }
 }
 
+// The creation calls write the slots of the new event directly: it comes from the pool with
+// no field set and its list of fields already out of date.
 HIDEventRef HIDEvent::pointerEvent(uint64_t timestamp, double x, double y, double z, uint32_t buttonMask,
                                    uint32_t options) {
+    HIDEventRef e = HIDEventPool::make(kHIDEventTypePointer, timestamp, options);
+    constexpr int first = hidFieldSlot(kHIDEventFieldPointerX);
+    static_assert(hidFieldSlot(kHIDEventFieldPointerButtonMask) == first + 3 && !hidFieldSlotIsDouble(first + 3));
+    e->slots_[first] = std::bit_cast<uint64_t>(x);
+    e->slots_[first + 1] = std::bit_cast<uint64_t>(y);
+    e->slots_[first + 2] = std::bit_cast<uint64_t>(z);
+    e->slots_[first + 3] = static_cast<uint64_t>(static_cast<int64_t>(buttonMask));
+    e->known_ |= uint64_t{0xf} << first;
+    return e;
+}
+
+HIDEventRef HIDEvent::pointerEventLiteral(uint64_t timestamp, double x, double y, double z, uint32_t buttonMask,
+                                          uint32_t options) {
     HIDEventRef e = create(kHIDEventTypePointer, timestamp, options);
     e->setDoubleValue(x, kHIDEventFieldPointerX);
     e->setDoubleValue(y, kHIDEventFieldPointerY);
@@ -93,16 +108,27 @@ HIDEventRef HIDEvent::pointerEvent(uint64_t timestamp, double x, double y, doubl
     return e;
 }
 
-namespace {
 template <uint32_t Type>
-HIDEventRef threeAxisEvent(uint64_t timestamp, double x, double y, double z, uint32_t options) {
-    HIDEventRef e = HIDEvent::create(Type, timestamp, options);
-    e->setDoubleValue(x, hidFieldSelector(Type, 0));
-    e->setDoubleValue(y, hidFieldSelector(Type, 1));
-    e->setDoubleValue(z, hidFieldSelector(Type, 2));
+HIDEventRef HIDEvent::threeAxisEvent(uint64_t timestamp, double x, double y, double z, uint32_t options) {
+    HIDEventRef e = HIDEventPool::make(Type, timestamp, options);
+    constexpr int first = hidFieldSlot(hidFieldSelector(Type, 0));
+    static_assert(hidFieldSlot(hidFieldSelector(Type, 2)) == first + 2 && hidFieldSlotIsDouble(first) &&
+                  hidFieldSlotIsDouble(first + 2));
+    e->slots_[first] = std::bit_cast<uint64_t>(x);
+    e->slots_[first + 1] = std::bit_cast<uint64_t>(y);
+    e->slots_[first + 2] = std::bit_cast<uint64_t>(z);
+    e->known_ |= uint64_t{0x7} << first;
     return e;
 }
-}  // namespace
+
+HIDEventRef HIDEvent::threeAxisEventLiteral(uint32_t type, uint64_t timestamp, double x, double y, double z,
+                                            uint32_t options) {
+    HIDEventRef e = create(type, timestamp, options);
+    e->setDoubleValue(x, hidFieldSelector(type, 0));
+    e->setDoubleValue(y, hidFieldSelector(type, 1));
+    e->setDoubleValue(z, hidFieldSelector(type, 2));
+    return e;
+}
 
 HIDEventRef HIDEvent::scrollEvent(uint64_t timestamp, double x, double y, double z, uint32_t options) {
     return threeAxisEvent<kHIDEventTypeScroll>(timestamp, x, y, z, options);
@@ -117,7 +143,7 @@ HIDEventRef HIDEvent::createRotationEvent(uint64_t timestamp, double x, double y
 }
 
 HIDEventRef HIDEvent::createButtonEvent(uint64_t timestamp, uint32_t buttonMask, uint32_t options) {
-    HIDEventRef e = create(kHIDEventTypeButton, timestamp, options);
+    HIDEventRef e = HIDEventPool::make(kHIDEventTypeButton, timestamp, options);
     e->setIntegerValue(buttonMask, kHIDEventFieldButtonMask);
     return e;
 }

@@ -157,6 +157,12 @@ public:
     static HIDEventRef createScaleEvent(uint64_t timestamp, double x, double y, double z, uint32_t options);
     static HIDEventRef createRotationEvent(uint64_t timestamp, double x, double y, double z, uint32_t options);
     static HIDEventRef createButtonEvent(uint64_t timestamp, uint32_t buttonMask, uint32_t options);
+    // The pointer and three-axis creation calls written as a new event and one setter call per
+    // field; the calls above write the fields' slots at once and must make the same events.
+    static HIDEventRef pointerEventLiteral(uint64_t timestamp, double x, double y, double z, uint32_t buttonMask,
+                                           uint32_t options);
+    static HIDEventRef threeAxisEventLiteral(uint32_t type, uint64_t timestamp, double x, double y, double z,
+                                             uint32_t options);
 
     uint32_t type() const { return type_; }
     uint64_t timestamp() const { return timestamp_; }
@@ -228,6 +234,8 @@ public:
 private:
     friend class HIDEventPool;
 
+    template <uint32_t Type>
+    static HIDEventRef threeAxisEvent(uint64_t timestamp, double x, double y, double z, uint32_t options);
     // Truncation toward zero that stays defined for NaN and out-of-range values.
     static int64_t truncateToInteger(double v) {
         if (v != v) return 0;

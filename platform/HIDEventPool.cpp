@@ -3,6 +3,7 @@
 #include <atomic>
 #include <new>
 #include <thread>
+#include <type_traits>
 
 #include "HIDEvent.h"
 
@@ -39,11 +40,11 @@ struct PoolState {
     size_t blocksIdle = 0;
 };
 
-// Never destroyed: events may be released by other objects' destructors at exit.
-PoolState& state() {
-    static PoolState* s = new PoolState;
-    return *s;
-}
+// Constant-initialised and never destroyed (there is nothing to destroy): events may be
+// released by other objects' destructors at exit.
+static_assert(std::is_trivially_destructible_v<PoolState>);
+constinit PoolState poolState;
+PoolState& state() { return poolState; }
 
 struct Guard {
     explicit Guard(SpinLock& l) : lock(l) { lock.lock(); }
@@ -101,14 +102,28 @@ void HIDEventPool::recycle(HIDEvent* event) noexcept {
     delete event;
 }
 
+HIDEvent* HIDEventPool::newEvent(uint32_t type, uint64_t timestamp, uint32_t options) {
+    auto* event = new HIDEvent(type, timestamp, options);
+    event->list_.reserve(kInitialFields);
+    event->children_.reserve(kInitialChildren);
+    return event;
+}
+
 std::shared_ptr<HIDEvent> HIDEventPool::make(uint32_t type, uint64_t timestamp, uint32_t options) {
     PoolState& s = state();
-    HIDEvent* event = nullptr;
+    HIDEvent* event;
+    void* block = nullptr;
     {
+        // An idle event and the block that will count its references, under one lock.
         Guard guard(s.lock);
         if ((event = s.idleEvents) != nullptr) {
             s.idleEvents = event->poolNext_;
             --s.idle;
+            if (IdleBlock* idle = s.idleBlocks) {
+                s.idleBlocks = idle->next;
+                --s.blocksIdle;
+                block = idle;
+            }
         } else {
             ++s.created;
         }
@@ -119,11 +134,10 @@ std::shared_ptr<HIDEvent> HIDEventPool::make(uint32_t type, uint64_t timestamp, 
         event->options_ = options;
         event->timestamp_ = timestamp;
     } else {
-        event = new HIDEvent(type, timestamp, options);
-        event->list_.reserve(kInitialFields);
-        event->children_.reserve(kInitialChildren);
+        event = newEvent(type, timestamp, options);
     }
-    return std::shared_ptr<HIDEvent>(event, Recycler{}, HIDEventBlockAllocator<HIDEvent>{});
+    // Without a block taken here the allocator gets one from allocateBlock.
+    return std::shared_ptr<HIDEvent>(event, Recycler{}, HIDEventBlockAllocator<HIDEvent>(block));
 }
 
 HIDEventPool::Statistics HIDEventPool::statistics() {
