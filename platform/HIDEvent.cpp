@@ -70,7 +70,6 @@ void HIDEvent::resetForPool() noexcept {
     }
     others_.clear();
     list_.clear();
-    listFresh_.store(false, std::memory_order_relaxed);
     children_.clear();
     if (others_.capacity() > HIDEventPool::kKeepFields) std::vector<Field>().swap(others_);
     if (list_.capacity() > HIDEventPool::kKeepFields) {
@@ -84,7 +83,7 @@ void HIDEvent::resetForPool() noexcept {
 }
 
 // The creation calls write the slots of the new event directly: it comes from the pool with
-// no field set and its list of fields already out of date.
+// no field set.
 HIDEventRef HIDEvent::pointerEvent(uint64_t timestamp, double x, double y, double z, uint32_t buttonMask,
                                    uint32_t options) {
     HIDEventRef e = HIDEventPool::make(kHIDEventTypePointer, timestamp, options);
@@ -183,7 +182,6 @@ void HIDEvent::setOtherDoubleValue(double value, uint32_t selector) {
 }
 
 HIDEvent::Field& HIDEvent::otherFieldForWriting(uint32_t selector, HIDFieldKind kind) {
-    listFresh_.store(false, std::memory_order_relaxed);
     for (auto it = others_.begin(); it != others_.end(); ++it) {
         if (it->selector == selector) {
             it->kind = kind;
@@ -229,11 +227,21 @@ void HIDEvent::forEachField(Visit&& visit) const {
 }
 
 const std::vector<HIDEvent::Field>& HIDEvent::fields() const {
-    if (listFresh_.load(std::memory_order_acquire)) return list_;
+    // The list is written only when it no longer matches the fields, so that readers on
+    // several threads may list the same event (as they could always read it).
     while (listLock_.test_and_set(std::memory_order_acquire)) std::this_thread::yield();
-    if (!listFresh_.load(std::memory_order_relaxed)) {
+    size_t n = 0;
+    bool matches = true;
+    forEachField([this, &n, &matches](uint32_t selector, HIDFieldKind kind, int64_t integer, double real,
+                                      const std::vector<uint8_t>& data) {
+        if (!matches) return;
+        const Field* f = n < list_.size() ? &list_[n++] : nullptr;
+        matches = f && f->selector == selector && f->kind == kind && f->integer == integer &&
+                  std::bit_cast<uint64_t>(f->real) == std::bit_cast<uint64_t>(real) && f->data == data;
+    });
+    if (!matches || n != list_.size()) {
         // Entries are overwritten in place, so the storage of their data is reused.
-        size_t n = 0;
+        n = 0;
         forEachField([this, &n](uint32_t selector, HIDFieldKind kind, int64_t integer, double real,
                                 const std::vector<uint8_t>& data) {
             if (n == list_.size()) list_.push_back(Field{selector, kind, integer, real, {}});
@@ -245,7 +253,6 @@ const std::vector<HIDEvent::Field>& HIDEvent::fields() const {
             f.data.assign(data.begin(), data.end());
         });
         list_.resize(n, Field{0, HIDFieldKind::Integer, 0, 0.0, {}});
-        listFresh_.store(true, std::memory_order_release);
     }
     listLock_.clear(std::memory_order_release);
     return list_;

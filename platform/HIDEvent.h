@@ -210,8 +210,9 @@ public:
         const int slot = hidFieldSlot(selector);
         return slot >= 0 ? (known_ >> slot & 1) != 0 : findOtherField(selector) != nullptr;
     }
-    // Every field that was set, in ascending selector order. Listed afresh after a change
-    // (into storage the event keeps, so that a warm event lists its fields without the heap).
+    // Every field that was set, in ascending selector order. Listed afresh when the fields
+    // changed, into storage the event keeps, so that a warm event lists its fields without
+    // the heap; the reference stays valid, and lists the fields as they are after each call.
     const std::vector<Field>& fields() const;
 
     // Children.
@@ -246,7 +247,6 @@ private:
     void storeSlot(int slot, uint64_t bits) {
         slots_[static_cast<size_t>(slot)] = bits;
         known_ |= uint64_t{1} << slot;
-        listFresh_.store(false, std::memory_order_relaxed);
     }
 
     // The vendor data field and unknown selectors, kept in ascending selector order in
@@ -281,9 +281,8 @@ private:
     std::array<uint64_t, kHIDFieldSlotCount> slots_{};
     std::vector<Field> others_;
     std::vector<HIDEventRef> children_;
-    // What fields() returns, and whether it still lists the fields as they are.
+    // What fields() returns: the fields as they were when last listed.
     mutable std::vector<Field> list_;
-    mutable std::atomic<bool> listFresh_{false};
     mutable std::atomic_flag listLock_ = ATOMIC_FLAG_INIT;
 };
 

@@ -15,6 +15,7 @@
 #include <map>
 #include <random>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "bench/support/AllocationCounter.h"
@@ -431,6 +432,28 @@ TEST(EventFieldSlots, ListingTheFieldsOfAWarmEventTakesNothingFromTheHeap) {
         ASSERT_EQ(e->fields()[1].real, i * 0.5);  // after the vendor data field
     }
     EXPECT_EQ(perf::allocationCount().allocations, before.allocations);
+}
+
+TEST(EventFieldSlots, SeveralThreadsListTheSameEventAlike) {
+    HIDEventRef e = HIDEvent::create(kHIDEventTypeDigitizer, 1);
+    const uint8_t bytes[] = {4, 5, 6};
+    e->setDataValue(bytes, sizeof bytes, kHIDEventFieldVendorDefinedData);
+    for (uint32_t index = 0; index <= 9; ++index) e->setDoubleValue(index * 0.25, hidFieldSelector(11, index));
+    e->setIntegerValue(-3, 0xb0042);
+    const HIDEvent& shared = *e;
+    auto reader = [&shared](int* wrong) {
+        for (int i = 0; i < 20000; ++i) {
+            const std::vector<Field>& list = shared.fields();
+            if (list.size() != 12 || list[0].data.size() != 3 || list[11].integer != -3) ++*wrong;
+        }
+    };
+    int wrongA = 0;
+    int wrongB = 0;
+    std::thread a(reader, &wrongA), b(reader, &wrongB);
+    a.join();
+    b.join();
+    EXPECT_EQ(wrongA, 0);
+    EXPECT_EQ(wrongB, 0);
 }
 
 }  // namespace
