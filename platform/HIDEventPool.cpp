@@ -20,15 +20,23 @@ static_assert(HIDEventPool::kBlockSize >= sizeof(IdleBlock));
 class SpinLock {
 public:
     void lock() noexcept {
-        while (flag_.test_and_set(std::memory_order_acquire)) {
-            while (flag_.test(std::memory_order_relaxed)) std::this_thread::yield();
-        }
+        if (flag_.test_and_set(std::memory_order_acquire)) waitAndLock(flag_);
     }
     void unlock() noexcept { flag_.clear(std::memory_order_release); }
 
 private:
+    // Held by another thread: yields until it is free and takes it. Kept apart from lock()
+    // so that the uncontended path needs no registers saved.
+    static void waitAndLock(std::atomic_flag& flag) noexcept;
+
     std::atomic_flag flag_ = ATOMIC_FLAG_INIT;
 };
+
+void SpinLock::waitAndLock(std::atomic_flag& flag) noexcept {
+    do {
+        while (flag.test(std::memory_order_relaxed)) std::this_thread::yield();
+    } while (flag.test_and_set(std::memory_order_acquire));
+}
 
 struct PoolState {
     SpinLock lock;
