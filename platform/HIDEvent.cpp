@@ -170,13 +170,25 @@ double HIDEvent::otherDoubleValue(uint32_t selector) const {
 }
 
 void HIDEvent::setOtherIntegerValue(int64_t value, uint32_t selector) {
-    // Only the vendor data field and unknown selectors come here: the data field ignores
-    // numbers, an unknown selector becomes (or stays) an integer.
+    // The vendor numbers are integer slots; the data field ignores numbers; an unknown
+    // selector becomes (or stays) an integer.
+    const int slot = hidFieldSlot(selector);
+    if (slot >= 0) {
+        storeSlot(slot, hidFieldSlotIsDouble(slot) ? std::bit_cast<uint64_t>(static_cast<double>(value))
+                                                   : static_cast<uint64_t>(value));
+        return;
+    }
     if (hidFieldKind(selector, HIDFieldKind::Integer) != HIDFieldKind::Integer) return;
     otherFieldForWriting(selector, HIDFieldKind::Integer).integer = value;
 }
 
 void HIDEvent::setOtherDoubleValue(double value, uint32_t selector) {
+    const int slot = hidFieldSlot(selector);
+    if (slot >= 0) {
+        storeSlot(slot, hidFieldSlotIsDouble(slot) ? std::bit_cast<uint64_t>(value)
+                                                   : static_cast<uint64_t>(truncateToInteger(value)));
+        return;
+    }
     if (hidFieldKind(selector, HIDFieldKind::Double) != HIDFieldKind::Double) return;
     otherFieldForWriting(selector, HIDFieldKind::Double).real = value;
 }

@@ -193,15 +193,18 @@ public:
     }
     const std::vector<uint8_t>& dataValueForField(uint32_t selector) const;
     // A known field keeps its own kind whatever setter is used; an unknown one takes the setter's.
+    // Writes to the vendor fields (made once per device, not per frame) stay out of line:
+    // inlined, they let GCC 12 inline more of a caller such as the fuzz frame decoder, where
+    // it then reports a false -Wfree-nonheap-object.
     void setIntegerValue(int64_t value, uint32_t selector) {
         const int slot = hidFieldSlot(selector);
-        if (slot < 0) return setOtherIntegerValue(value, selector);
+        if (slot < 0 || (selector >> 16) == kHIDEventTypeVendorDefined) return setOtherIntegerValue(value, selector);
         storeSlot(slot, hidFieldSlotIsDouble(slot) ? std::bit_cast<uint64_t>(static_cast<double>(value))
                                                    : static_cast<uint64_t>(value));
     }
     void setDoubleValue(double value, uint32_t selector) {
         const int slot = hidFieldSlot(selector);
-        if (slot < 0) return setOtherDoubleValue(value, selector);
+        if (slot < 0 || (selector >> 16) == kHIDEventTypeVendorDefined) return setOtherDoubleValue(value, selector);
         storeSlot(slot, hidFieldSlotIsDouble(slot) ? std::bit_cast<uint64_t>(value)
                                                    : static_cast<uint64_t>(truncateToInteger(value)));
     }
@@ -259,6 +262,7 @@ private:
     }
     int64_t otherIntegerValue(uint32_t selector) const;
     double otherDoubleValue(uint32_t selector) const;
+    // The setters out of line: for the vendor fields and for the selectors without a slot.
     void setOtherIntegerValue(int64_t value, uint32_t selector);
     void setOtherDoubleValue(double value, uint32_t selector);
     // The field to write, made (with the given kind) where it is missing.
