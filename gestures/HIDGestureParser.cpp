@@ -2,6 +2,7 @@
 
 #include <cmath>
 #include <cstring>
+#include <utility>
 
 #include "common/TickConversion.h"
 #include "filter/FilterLogging.h"
@@ -183,8 +184,11 @@ HIDEventRef HIDGestureParser::parseHandGesturesCreateHIDEvents(HIDHandStatistics
     if (!handEvent) return pointerEvent;
 
     parseGesture(handStats, handMotion);
-    return createGestureEvents(handStats, handMotion, handEvent, pointerEvent, nullptr, dispatcher, tapToClickEnabled,
-                               twoFingersSecondaryClickEnabled);
+    if (!appendGestureEvents(handStats, handMotion, handEvent, pointerEvent, dispatcher, tapToClickEnabled,
+                             twoFingersSecondaryClickEnabled)) {
+        return nullptr;
+    }
+    return pointerEvent;
 }
 
 void HIDGestureParser::quantizeMotion(HIDHandMotion& handMotion) const {
@@ -335,14 +339,24 @@ HIDEventRef HIDGestureParser::createGestureEvents(HIDHandStatistics& handStats, 
                                                   const HIDDispatchHandler& dispatcher, bool tapToClickEnabled,
                                                   bool twoFingersSecondaryClickEnabled) {
     if (!handEvent || !pointerEvent) return nullptr;
+    if (!appendGestureEvents(handStats, handMotion, handEvent, pointerEvent, dispatcher, tapToClickEnabled,
+                             twoFingersSecondaryClickEnabled)) {
+        return nullptr;
+    }
+    return pointerEvent;
+}
+
+bool HIDGestureParser::appendGestureEvents(HIDHandStatistics& handStats, HIDHandMotion& handMotion,
+                                           const HIDEventRef& handEvent, const HIDEventRef& pointerEvent,
+                                           const HIDDispatchHandler& dispatcher, bool tapToClickEnabled,
+                                           bool twoFingersSecondaryClickEnabled) {
     const uint64_t timestamp = handEvent->timestamp();
     const double now = handStats.currentTimestamp();
     const int32_t gesture = currentGesture_;
     const int32_t previous = prevGesture_;
     const HIDMotion deltas = handMotion.motionDeltas();
-    const auto finish = [&pointerEvent]() -> HIDEventRef {
-        return pointerEvent->children().empty() ? nullptr : pointerEvent;
-    };
+    // The pointer event is the result when it carries anything.
+    const auto finish = [&pointerEvent]() { return !pointerEvent->children().empty(); };
 
     // The diving button. The pointer event's own mask stays the button state even when the
     // button event names the secondary button; intended.
@@ -354,7 +368,7 @@ HIDEventRef HIDGestureParser::createGestureEvents(HIDHandStatistics& handStats, 
         HIDEventRef button = HIDScaleEvent::statefulButtonEvent(timestamp, mask, 0);
         // A release goes out only after a press did.
         if (mask != 0 || buttonStateWasSent_) {
-            pointerEvent->appendEvent(button);
+            pointerEvent->appendEvent(std::move(button));
             if (handStats.currentButtonState() == 1) {
                 LoggingServiceFilter()->log("%s GESTURE BUTTON PRESSED", kCreateGestureEventsSignature);
                 buttonStateWasSent_ = true;
@@ -377,10 +391,10 @@ HIDEventRef HIDGestureParser::createGestureEvents(HIDHandStatistics& handStats, 
             HIDEventRef scroll = HIDEvent::scrollEvent(timestamp, 0.0, 0.0, 0.0, 0);
             scroll->setPhase(kHIDGesturePhaseEnded);
             pointerEvent->appendEvent(handEvent);
-            pointerEvent->appendEvent(scroll);
+            pointerEvent->appendEvent(std::move(scroll));
             handStats.setTimeofScrollEnd(now);
             LoggingServiceFilter()->log("%s GESTURE END SCROLL", kCreateGestureEventsSignature);
-            return pointerEvent;
+            return true;
         }
         HIDEventRef scaleEnd;
         HIDEventRef rotationEnd;
@@ -402,9 +416,9 @@ HIDEventRef HIDGestureParser::createGestureEvents(HIDHandStatistics& handStats, 
         }
         if (scaleEnd || rotationEnd) {
             pointerEvent->appendEvent(handEvent);
-            if (scaleEnd) pointerEvent->appendEvent(scaleEnd);
-            if (rotationEnd) pointerEvent->appendEvent(rotationEnd);
-            return pointerEvent;
+            if (scaleEnd) pointerEvent->appendEvent(std::move(scaleEnd));
+            if (rotationEnd) pointerEvent->appendEvent(std::move(rotationEnd));
+            return true;
         }
     }
 
@@ -417,7 +431,7 @@ HIDEventRef HIDGestureParser::createGestureEvents(HIDHandStatistics& handStats, 
             cancelScrollMayBegin(handStats, pointerEvent);
             LoggingServiceFilter()->log("%s GESTURE POINTER BEGAN", kCreateGestureEventsSignature);
         }
-        return pointerEvent;
+        return true;
     }
 
     if (gesture == kHIDGestureTypeScroll) {
@@ -439,12 +453,12 @@ HIDEventRef HIDGestureParser::createGestureEvents(HIDHandStatistics& handStats, 
             }
         } else {
             // A still frame in the middle of a scroll sends nothing but keeps the scroll.
-            if (still) return pointerEvent;
+            if (still) return true;
             currentPhase_ = kHIDGesturePhaseChanged;
         }
         scroll->setPhase(currentPhase_);
-        pointerEvent->appendEvent(scroll);
-        return pointerEvent;
+        pointerEvent->appendEvent(std::move(scroll));
+        return true;
     }
 
     if (gesture == kHIDGestureTypeRotate && deltas.rotate != 0.0f) {
@@ -459,7 +473,7 @@ HIDEventRef HIDGestureParser::createGestureEvents(HIDHandStatistics& handStats, 
         shouldEndRotate_ = true;
         rotation->setPhase(currentPhase_);
         pointerEvent->appendEvent(handEvent);
-        pointerEvent->appendEvent(rotation);
+        pointerEvent->appendEvent(std::move(rotation));
         return finish();
     }
 
@@ -475,7 +489,7 @@ HIDEventRef HIDGestureParser::createGestureEvents(HIDHandStatistics& handStats, 
         shouldEndScale_ = true;
         scale->setPhase(currentPhase_);
         pointerEvent->appendEvent(handEvent);
-        pointerEvent->appendEvent(scale);
+        pointerEvent->appendEvent(std::move(scale));
         return finish();
     }
 

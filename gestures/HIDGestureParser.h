@@ -53,6 +53,11 @@ public:
     const std::array<int32_t, kNumContactIndexes>& prevFingerType() const { return prevFingerType_; }
 
 private:
+    // The events of this frame's gesture appended to the pointer event (with the hand event);
+    // true when the pointer event is the result, false when nothing is to be sent.
+    bool appendGestureEvents(HIDHandStatistics& handStats, HIDHandMotion& handMotion, const HIDEventRef& handEvent,
+                             const HIDEventRef& pointerEvent, const HIDDispatchHandler& dispatcher,
+                             bool tapToClickEnabled, bool twoFingersSecondaryClickEnabled);
     // The closeness of the two fingers that selects the secondary button.
     static void updateTwoFingersClose(HIDHandStatistics& handStats, const HIDHandMotion& handMotion);
 

@@ -4,6 +4,9 @@
 // Events made by the creation calls and by copy() come from HIDEventPool and go back to it
 // when their last strong reference goes.
 
+#include <array>
+#include <atomic>
+#include <bit>
 #include <cstdint>
 #include <memory>
 #include <string>
@@ -105,6 +108,31 @@ constexpr HIDFieldKind hidFieldKind(uint32_t selector, HIDFieldKind fallback) {
 // True when the selector is one of the platform's known fields.
 bool hidFieldIsKnown(uint32_t selector);
 
+// Each of the platform's known integer and double fields has a fixed slot in every event,
+// numbered in ascending selector order; -1 for any other selector (the vendor data field and
+// selectors the platform does not know, which an event keeps in a short sorted list).
+constexpr int kHIDFieldSlotCount = 34;
+constexpr int hidFieldSlot(uint32_t selector) {
+    const uint32_t index = selector & 0xffff;
+    const int i = static_cast<int>(index);
+    switch (selector >> 16) {
+    case kHIDEventTypeVendorDefined: return index <= 3 ? i : -1;
+    case kHIDEventTypeButton: return index <= 1 ? 4 + i : index == 4 ? 6 : -1;
+    case kHIDEventTypeKeyboard: return index <= 2 ? 7 + i : -1;
+    case kHIDEventTypeRotation: return index <= 2 ? 10 + i : -1;
+    case kHIDEventTypeScroll: return index <= 2 ? 13 + i : -1;
+    case kHIDEventTypeScale: return index <= 2 ? 16 + i : -1;
+    case kHIDEventTypeDigitizer: return index <= 9 ? 19 + i : index == 0x1b ? 29 : -1;
+    case kHIDEventTypePointer: return index <= 3 ? 30 + i : -1;
+    default: return -1;
+    }
+}
+// The slots whose field is a double (the others hold integers).
+constexpr uint64_t kHIDDoubleFieldSlots = 0x7ull << 10 | 0x7ull << 13 | 0x7ull << 16 | 0x7ull << 19 | 0x7ull << 30;
+constexpr bool hidFieldSlotIsDouble(int slot) { return (kHIDDoubleFieldSlots >> slot & 1) != 0; }
+// The selector of a slot.
+uint32_t hidFieldSlotSelector(int slot);
+
 class HIDEventPool;
 
 class HIDEvent {
@@ -118,6 +146,8 @@ public:
     };
 
     HIDEvent(uint32_t type, uint64_t timestamp, uint32_t options = 0);
+    HIDEvent(const HIDEvent&) = delete;
+    HIDEvent& operator=(const HIDEvent&) = delete;
 
     // Creation calls. Each sets exactly the fields named and no others.
     static HIDEventRef create(uint32_t type, uint64_t timestamp, uint32_t options = 0);
@@ -127,6 +157,12 @@ public:
     static HIDEventRef createScaleEvent(uint64_t timestamp, double x, double y, double z, uint32_t options);
     static HIDEventRef createRotationEvent(uint64_t timestamp, double x, double y, double z, uint32_t options);
     static HIDEventRef createButtonEvent(uint64_t timestamp, uint32_t buttonMask, uint32_t options);
+    // The pointer and three-axis creation calls written as a new event and one setter call per
+    // field; the calls above write the fields' slots at once and must make the same events.
+    static HIDEventRef pointerEventLiteral(uint64_t timestamp, double x, double y, double z, uint32_t buttonMask,
+                                           uint32_t options);
+    static HIDEventRef threeAxisEventLiteral(uint32_t type, uint64_t timestamp, double x, double y, double z,
+                                             uint32_t options);
 
     uint32_t type() const { return type_; }
     uint64_t timestamp() const { return timestamp_; }
@@ -142,53 +178,54 @@ public:
 
     // Fields. A field that was never set reads as 0, 0.0 or empty data.
     int64_t integerValueForField(uint32_t selector) const {
-        const Field* f = findField(selector);
-        if (!f) return 0;
-        switch (f->kind) {
-        case HIDFieldKind::Integer: return f->integer;
-        case HIDFieldKind::Double: return truncateToInteger(f->real);
-        case HIDFieldKind::Data: return 0;
-        }
-        return 0;
+        const int slot = hidFieldSlot(selector);
+        if (slot < 0) return otherIntegerValue(selector);
+        const uint64_t bits = slots_[static_cast<size_t>(slot)];
+        return hidFieldSlotIsDouble(slot) ? truncateToInteger(std::bit_cast<double>(bits))
+                                          : static_cast<int64_t>(bits);
     }
     double doubleValueForField(uint32_t selector) const {
-        const Field* f = findField(selector);
-        if (!f) return 0.0;
-        switch (f->kind) {
-        case HIDFieldKind::Integer: return static_cast<double>(f->integer);
-        case HIDFieldKind::Double: return f->real;
-        case HIDFieldKind::Data: return 0.0;
-        }
-        return 0.0;
+        const int slot = hidFieldSlot(selector);
+        if (slot < 0) return otherDoubleValue(selector);
+        const uint64_t bits = slots_[static_cast<size_t>(slot)];
+        return hidFieldSlotIsDouble(slot) ? std::bit_cast<double>(bits)
+                                          : static_cast<double>(static_cast<int64_t>(bits));
     }
     const std::vector<uint8_t>& dataValueForField(uint32_t selector) const;
     // A known field keeps its own kind whatever setter is used; an unknown one takes the setter's.
+    // Writes to the vendor fields (made once per device, not per frame) stay out of line:
+    // inlined, they let GCC 12 inline more of a caller such as the fuzz frame decoder, where
+    // it then reports a false -Wfree-nonheap-object.
     void setIntegerValue(int64_t value, uint32_t selector) {
-        switch (hidFieldKind(selector, HIDFieldKind::Integer)) {
-        case HIDFieldKind::Integer: fieldForWriting(selector, HIDFieldKind::Integer).integer = value; break;
-        case HIDFieldKind::Double:
-            fieldForWriting(selector, HIDFieldKind::Double).real = static_cast<double>(value);
-            break;
-        case HIDFieldKind::Data: break;
-        }
+        const int slot = hidFieldSlot(selector);
+        if (slot < 0 || (selector >> 16) == kHIDEventTypeVendorDefined) return setOtherIntegerValue(value, selector);
+        storeSlot(slot, hidFieldSlotIsDouble(slot) ? std::bit_cast<uint64_t>(static_cast<double>(value))
+                                                   : static_cast<uint64_t>(value));
     }
     void setDoubleValue(double value, uint32_t selector) {
-        switch (hidFieldKind(selector, HIDFieldKind::Double)) {
-        case HIDFieldKind::Double: fieldForWriting(selector, HIDFieldKind::Double).real = value; break;
-        case HIDFieldKind::Integer:
-            fieldForWriting(selector, HIDFieldKind::Integer).integer = truncateToInteger(value);
-            break;
-        case HIDFieldKind::Data: break;
-        }
+        const int slot = hidFieldSlot(selector);
+        if (slot < 0 || (selector >> 16) == kHIDEventTypeVendorDefined) return setOtherDoubleValue(value, selector);
+        storeSlot(slot, hidFieldSlotIsDouble(slot) ? std::bit_cast<uint64_t>(value)
+                                                   : static_cast<uint64_t>(truncateToInteger(value)));
     }
     void setDataValue(const uint8_t* bytes, size_t length, uint32_t selector);
-    bool hasField(uint32_t selector) const { return findField(selector) != nullptr; }
-    // Every field that was set, in ascending selector order.
-    const std::vector<Field>& fields() const { return fields_; }
+    bool hasField(uint32_t selector) const {
+        const int slot = hidFieldSlot(selector);
+        return slot >= 0 ? (known_ >> slot & 1) != 0 : findOtherField(selector) != nullptr;
+    }
+    // Every field that was set, in ascending selector order. Listed afresh when the fields
+    // changed, into storage the event keeps, so that a warm event lists its fields without
+    // the heap; the reference stays valid, and lists the fields as they are after each call.
+    const std::vector<Field>& fields() const;
 
     // Children.
     const std::vector<HIDEventRef>& children() const { return children_; }
-    void appendEvent(const HIDEventRef& child);
+    void appendEvent(const HIDEventRef& child) {
+        if (child) children_.push_back(child);
+    }
+    void appendEvent(HIDEventRef&& child) {
+        if (child) children_.push_back(std::move(child));
+    }
     // Removes the first child that is this very object; nothing when it is not a child.
     void removeEvent(const HIDEventRef& child);
 
@@ -201,28 +238,39 @@ public:
 private:
     friend class HIDEventPool;
 
-    // Fields are kept in ascending selector order; there are only ever a few.
-    const Field* findField(uint32_t selector) const {
-        for (const Field& f : fields_) {
+    template <uint32_t Type>
+    static HIDEventRef threeAxisEvent(uint64_t timestamp, double x, double y, double z, uint32_t options);
+    // Truncation toward zero that stays defined for NaN and out-of-range values.
+    static int64_t truncateToInteger(double v) {
+        if (v != v) return 0;
+        if (v >= 9.2233720368547758e18) return INT64_MAX;
+        if (v <= -9.2233720368547758e18) return INT64_MIN;
+        return static_cast<int64_t>(v);
+    }
+    void storeSlot(int slot, uint64_t bits) {
+        slots_[static_cast<size_t>(slot)] = bits;
+        known_ |= uint64_t{1} << slot;
+    }
+
+    // The vendor data field and unknown selectors, kept in ascending selector order in
+    // `others_`; there are only ever a few.
+    const Field* findOtherField(uint32_t selector) const {
+        for (const Field& f : others_) {
             if (f.selector >= selector) return f.selector == selector ? &f : nullptr;
         }
         return nullptr;
     }
+    int64_t otherIntegerValue(uint32_t selector) const;
+    double otherDoubleValue(uint32_t selector) const;
+    // The setters out of line: for the vendor fields and for the selectors without a slot.
+    void setOtherIntegerValue(int64_t value, uint32_t selector);
+    void setOtherDoubleValue(double value, uint32_t selector);
     // The field to write, made (with the given kind) where it is missing.
-    Field& fieldForWriting(uint32_t selector, HIDFieldKind kind) {
-        for (Field& f : fields_) {
-            if (f.selector == selector) {
-                f.kind = kind;
-                return f;
-            }
-            if (f.selector > selector) return insertField(&f, selector, kind);
-        }
-        fields_.push_back(Field{selector, kind, 0, 0.0, {}});
-        return fields_.back();
-    }
-    Field& insertField(Field* before, uint32_t selector, HIDFieldKind kind);
-    // Truncation toward zero that stays defined for NaN and out-of-range values.
-    static int64_t truncateToInteger(double v);
+    Field& otherFieldForWriting(uint32_t selector, HIDFieldKind kind);
+    // Calls `visit(selector, kind, integer, real, data)` for every set field in ascending
+    // selector order.
+    template <typename Visit>
+    void forEachField(Visit&& visit) const;
     // Back to the state of a new event, keeping the storage (pool use only).
     void resetForPool() noexcept;
 
@@ -232,8 +280,14 @@ private:
     uint64_t timestamp_;
     uint64_t senderID_ = 0;
     uint16_t phase_ = 0;
-    std::vector<Field> fields_;
+    // Bit s set: slot s holds a value. An unset slot holds zero bits (0 and +0.0).
+    uint64_t known_ = 0;
+    std::array<uint64_t, kHIDFieldSlotCount> slots_{};
+    std::vector<Field> others_;
     std::vector<HIDEventRef> children_;
+    // What fields() returns: the fields as they were when last listed.
+    mutable std::vector<Field> list_;
+    mutable std::atomic_flag listLock_ = ATOMIC_FLAG_INIT;
 };
 
 }  // namespace orvane

@@ -3,6 +3,7 @@
 #include <atomic>
 #include <new>
 #include <thread>
+#include <type_traits>
 
 #include "HIDEvent.h"
 
@@ -19,15 +20,23 @@ static_assert(HIDEventPool::kBlockSize >= sizeof(IdleBlock));
 class SpinLock {
 public:
     void lock() noexcept {
-        while (flag_.test_and_set(std::memory_order_acquire)) {
-            while (flag_.test(std::memory_order_relaxed)) std::this_thread::yield();
-        }
+        if (flag_.test_and_set(std::memory_order_acquire)) waitAndLock(flag_);
     }
     void unlock() noexcept { flag_.clear(std::memory_order_release); }
 
 private:
+    // Held by another thread: yields until it is free and takes it. Kept apart from lock()
+    // so that the uncontended path needs no registers saved.
+    static void waitAndLock(std::atomic_flag& flag) noexcept;
+
     std::atomic_flag flag_ = ATOMIC_FLAG_INIT;
 };
+
+void SpinLock::waitAndLock(std::atomic_flag& flag) noexcept {
+    do {
+        while (flag.test(std::memory_order_relaxed)) std::this_thread::yield();
+    } while (flag.test_and_set(std::memory_order_acquire));
+}
 
 struct PoolState {
     SpinLock lock;
@@ -39,11 +48,11 @@ struct PoolState {
     size_t blocksIdle = 0;
 };
 
-// Never destroyed: events may be released by other objects' destructors at exit.
-PoolState& state() {
-    static PoolState* s = new PoolState;
-    return *s;
-}
+// Constant-initialised and never destroyed (there is nothing to destroy): events may be
+// released by other objects' destructors at exit.
+static_assert(std::is_trivially_destructible_v<PoolState>);
+constinit PoolState poolState;
+PoolState& state() { return poolState; }
 
 struct Guard {
     explicit Guard(SpinLock& l) : lock(l) { lock.lock(); }
@@ -101,14 +110,28 @@ void HIDEventPool::recycle(HIDEvent* event) noexcept {
     delete event;
 }
 
+HIDEvent* HIDEventPool::newEvent(uint32_t type, uint64_t timestamp, uint32_t options) {
+    auto* event = new HIDEvent(type, timestamp, options);
+    event->list_.reserve(kInitialFields);
+    event->children_.reserve(kInitialChildren);
+    return event;
+}
+
 std::shared_ptr<HIDEvent> HIDEventPool::make(uint32_t type, uint64_t timestamp, uint32_t options) {
     PoolState& s = state();
-    HIDEvent* event = nullptr;
+    HIDEvent* event;
+    void* block = nullptr;
     {
+        // An idle event and the block that will count its references, under one lock.
         Guard guard(s.lock);
         if ((event = s.idleEvents) != nullptr) {
             s.idleEvents = event->poolNext_;
             --s.idle;
+            if (IdleBlock* idle = s.idleBlocks) {
+                s.idleBlocks = idle->next;
+                --s.blocksIdle;
+                block = idle;
+            }
         } else {
             ++s.created;
         }
@@ -119,11 +142,10 @@ std::shared_ptr<HIDEvent> HIDEventPool::make(uint32_t type, uint64_t timestamp, 
         event->options_ = options;
         event->timestamp_ = timestamp;
     } else {
-        event = new HIDEvent(type, timestamp, options);
-        event->fields_.reserve(kInitialFields);
-        event->children_.reserve(kInitialChildren);
+        event = newEvent(type, timestamp, options);
     }
-    return std::shared_ptr<HIDEvent>(event, Recycler{}, HIDEventBlockAllocator<HIDEvent>{});
+    // Without a block taken here the allocator gets one from allocateBlock.
+    return std::shared_ptr<HIDEvent>(event, Recycler{}, HIDEventBlockAllocator<HIDEvent>(block));
 }
 
 HIDEventPool::Statistics HIDEventPool::statistics() {

@@ -31,8 +31,9 @@ public:
     };
     static Statistics statistics();
 
-    // Room kept in a new event for this many fields and children; more grows the storage,
-    // which the event keeps while it is pooled unless it grew beyond the keep limits.
+    // Room kept in a new event for a list of this many fields and for this many children;
+    // more grows the storage, which the event keeps while it is pooled unless it grew beyond
+    // the keep limits (which also bound the list of unknown fields kept).
     static constexpr size_t kInitialFields = 12;
     static constexpr size_t kInitialChildren = 6;
     static constexpr size_t kKeepFields = 64;
@@ -46,19 +47,35 @@ public:
     static void deallocateBlock(void* block, size_t size) noexcept;
     // Takes back an event whose last strong reference went.
     static void recycle(HIDEvent* event) noexcept;
+
+private:
+    // A new event, for when none is idle.
+    static HIDEvent* newEvent(uint32_t type, uint64_t timestamp, uint32_t options);
 };
 
-// The allocator of the reference-count blocks of pooled events.
+// The allocator of the reference-count blocks of pooled events. It may be given a block
+// already taken from the pool, which its first allocation that fits then uses.
 template <typename T>
 struct HIDEventBlockAllocator {
     using value_type = T;
     HIDEventBlockAllocator() = default;
+    explicit HIDEventBlockAllocator(void* block) noexcept : block(block) {}
     template <typename U>
-    HIDEventBlockAllocator(const HIDEventBlockAllocator<U>&) noexcept {}
-    T* allocate(size_t n) { return static_cast<T*>(HIDEventPool::allocateBlock(n * sizeof(T))); }
+    HIDEventBlockAllocator(const HIDEventBlockAllocator<U>& other) noexcept : block(other.block) {}
+    T* allocate(size_t n) {
+        if (void* taken = block) {
+            block = nullptr;
+            if (n * sizeof(T) <= HIDEventPool::kBlockSize) return static_cast<T*>(taken);
+            HIDEventPool::deallocateBlock(taken, HIDEventPool::kBlockSize);
+        }
+        return static_cast<T*>(HIDEventPool::allocateBlock(n * sizeof(T)));
+    }
     void deallocate(T* p, size_t n) noexcept { HIDEventPool::deallocateBlock(p, n * sizeof(T)); }
     template <typename U>
     bool operator==(const HIDEventBlockAllocator<U>&) const noexcept { return true; }
+
+    // A pool block not yet handed out, or nullptr.
+    void* block = nullptr;
 };
 
 }  // namespace orvane

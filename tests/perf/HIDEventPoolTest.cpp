@@ -112,6 +112,67 @@ TEST(HIDEventPool, FieldsWrittenOutOfOrderStayInSelectorOrder) {
     EXPECT_EQ(e->integerValueForField(kHIDEventFieldDigitizerTouch), 6);
 }
 
+TEST(HIDEventPool, EveryKindOfFieldIsGoneWhenTheEventComesBack) {
+    HIDEventRef first = HIDEvent::create(kHIDEventTypeVendorDefined, 1);
+    const uint8_t bytes[] = {7, 7, 7};
+    first->setDataValue(bytes, sizeof bytes, kHIDEventFieldVendorDefinedData);
+    first->setIntegerValue(3, kHIDEventFieldVendorDefinedUsage);
+    first->setDoubleValue(-0.0, kHIDEventFieldScrollY);
+    first->setIntegerValue(9, 0xb0042);
+    ASSERT_EQ(first->fields().size(), 4u);
+    const HIDEvent* address = first.get();
+    first.reset();
+    HIDEventRef second = HIDEvent::create(kHIDEventTypeVendorDefined, 2);
+    ASSERT_EQ(second.get(), address);
+    EXPECT_TRUE(second->fields().empty());
+    EXPECT_TRUE(second->dataValueForField(kHIDEventFieldVendorDefinedData).empty());
+    EXPECT_FALSE(second->hasField(kHIDEventFieldVendorDefinedUsage));
+    EXPECT_FALSE(second->hasField(kHIDEventFieldScrollY));
+    EXPECT_FALSE(second->hasField(0xb0042));
+    EXPECT_EQ(second->integerValueForField(0xb0042), 0);
+    EXPECT_EQ(second->description(), "{type 1 ts 2 sender 0 phase 0}");
+}
+
+TEST(HIDEventPool, MakingAWarmEventTakesOneIdleEventAndOneIdleBlock) {
+    // Warm: an event and its block made and given back.
+    HIDEvent::create(kHIDEventTypePointer, 1).reset();
+    const HIDEventPool::Statistics before = HIDEventPool::statistics();
+    ASSERT_GE(before.idle, 1u);
+    ASSERT_GE(before.blocksIdle, 1u);
+    HIDEventRef e = HIDEvent::pointerEvent(2, 1.0, 2.0, 0.0, 0, 0);
+    std::weak_ptr<HIDEvent> weak = e;
+    const HIDEventPool::Statistics during = HIDEventPool::statistics();
+    EXPECT_EQ(during.created, before.created);
+    EXPECT_EQ(during.blocksCreated, before.blocksCreated);
+    EXPECT_EQ(during.idle, before.idle - 1);
+    EXPECT_EQ(during.blocksIdle, before.blocksIdle - 1);
+    e.reset();
+    // The event is back at once, its block once the weak reference goes too.
+    EXPECT_EQ(HIDEventPool::statistics().idle, before.idle);
+    EXPECT_EQ(HIDEventPool::statistics().blocksIdle, before.blocksIdle - 1);
+    weak.reset();
+    EXPECT_EQ(HIDEventPool::statistics().blocksIdle, before.blocksIdle);
+}
+
+TEST(HIDEventPool, AllocatorGivenABlockUsesItOnceThenAsksThePool) {
+    void* block = HIDEventPool::allocateBlock(HIDEventPool::kBlockSize);
+    HIDEventBlockAllocator<uint64_t> allocator(block);
+    uint64_t* first = allocator.allocate(2);
+    EXPECT_EQ(static_cast<void*>(first), block);
+    EXPECT_EQ(allocator.block, nullptr);
+    uint64_t* second = allocator.allocate(2);
+    EXPECT_NE(second, first);
+    allocator.deallocate(first, 2);
+    allocator.deallocate(second, 2);
+    // A block too small for the request goes back to the pool and a large one comes from the heap.
+    const size_t idleBlocks = HIDEventPool::statistics().blocksIdle;
+    HIDEventBlockAllocator<uint64_t> small(HIDEventPool::allocateBlock(8));
+    EXPECT_EQ(HIDEventPool::statistics().blocksIdle, idleBlocks - 1);
+    uint64_t* large = small.allocate(HIDEventPool::kBlockSize);
+    EXPECT_EQ(HIDEventPool::statistics().blocksIdle, idleBlocks);
+    small.deallocate(large, HIDEventPool::kBlockSize);
+}
+
 TEST(HIDEventPool, EventsMadeAndDroppedOnSeveralThreadsAllComeBack) {
     auto work = [] {
         for (int i = 0; i < 20000; ++i) {

@@ -1,6 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
+#include <vector>
 
 #include "platform/HIDEvent.h"
 
@@ -128,4 +130,149 @@ TEST(HIDEvent, DescriptionNamesTypeFieldsAndChildren) {
     parent->setIntegerValue(1, kHIDEventFieldDigitizerTouch);
     parent->appendEvent(HIDEvent::create(kHIDEventTypeDigitizer, 7));
     EXPECT_EQ(parent->description(), "{type 11 ts 7 sender 0 phase 0 0xb0009=1 children [{type 11 ts 7 sender 0 phase 0}]}");
+}
+
+namespace {
+
+// Every selector the platform knows, in ascending order.
+std::vector<uint32_t> knownSelectors() {
+    std::vector<uint32_t> selectors;
+    for (uint32_t type = 0; type <= 0x20; ++type) {
+        for (uint32_t index = 0; index <= 0x40; ++index) {
+            if (hidFieldIsKnown(hidFieldSelector(type, index))) selectors.push_back(hidFieldSelector(type, index));
+        }
+    }
+    return selectors;
+}
+
+}  // namespace
+
+TEST(HIDEvent, EveryKnownFieldReadsZeroUnsetAndKeepsItsKind) {
+    const std::vector<uint32_t> selectors = knownSelectors();
+    ASSERT_EQ(selectors.size(), 35u);  // 34 numbers and the vendor data
+    for (uint32_t selector : selectors) {
+        SCOPED_TRACE(testing::Message() << std::hex << "0x" << selector);
+        const HIDFieldKind kind = hidFieldKind(selector, HIDFieldKind::Integer);
+        auto e = HIDEvent::create(selector >> 16, 0);
+        EXPECT_EQ(e->integerValueForField(selector), 0);
+        EXPECT_EQ(e->doubleValueForField(selector), 0.0);
+        EXPECT_TRUE(e->dataValueForField(selector).empty());
+        EXPECT_FALSE(e->hasField(selector));
+
+        e->setDoubleValue(2.9, selector);
+        if (kind == HIDFieldKind::Data) {
+            EXPECT_FALSE(e->hasField(selector));  // numbers do not go into the data field
+            const uint8_t bytes[] = {9, 8};
+            e->setDataValue(bytes, 2, selector);
+            ASSERT_EQ(e->fields().size(), 1u);
+            EXPECT_EQ(e->fields()[0].kind, HIDFieldKind::Data);
+            EXPECT_EQ(e->dataValueForField(selector), std::vector<uint8_t>({9, 8}));
+            EXPECT_EQ(e->integerValueForField(selector), 0);
+            continue;
+        }
+        ASSERT_TRUE(e->hasField(selector));
+        ASSERT_EQ(e->fields().size(), 1u);
+        EXPECT_EQ(e->fields()[0].selector, selector);
+        EXPECT_EQ(e->fields()[0].kind, kind);
+        if (kind == HIDFieldKind::Double) {
+            EXPECT_EQ(e->doubleValueForField(selector), 2.9);
+            EXPECT_EQ(e->integerValueForField(selector), 2);
+        } else {
+            EXPECT_EQ(e->integerValueForField(selector), 2);  // truncated when written
+            EXPECT_EQ(e->doubleValueForField(selector), 2.0);
+        }
+        e->setIntegerValue(-7, selector);
+        EXPECT_EQ(e->fields()[0].kind, kind);
+        EXPECT_EQ(e->integerValueForField(selector), -7);
+        EXPECT_EQ(e->doubleValueForField(selector), -7.0);
+        // Data never goes into a number field.
+        const uint8_t bytes[] = {1};
+        e->setDataValue(bytes, 1, selector);
+        EXPECT_TRUE(e->dataValueForField(selector).empty());
+        EXPECT_EQ(e->integerValueForField(selector), -7);
+        EXPECT_EQ(e->fields().size(), 1u);
+    }
+}
+
+TEST(HIDEvent, UnknownFieldsKeepTheLastSettersKind) {
+    auto e = HIDEvent::create(kHIDEventTypeDigitizer, 0);
+    e->setIntegerValue(5, 0xb000a);
+    e->setDoubleValue(-1.75, 0xb000a);
+    EXPECT_EQ(e->fields()[0].kind, HIDFieldKind::Double);
+    EXPECT_EQ(e->integerValueForField(0xb000a), -1);
+    const uint8_t bytes[] = {0xab};
+    e->setDataValue(bytes, 1, 0xb000a);
+    EXPECT_EQ(e->fields()[0].kind, HIDFieldKind::Data);
+    EXPECT_EQ(e->doubleValueForField(0xb000a), 0.0);
+    EXPECT_EQ(e->dataValueForField(0xb000a), std::vector<uint8_t>({0xab}));
+    e->setIntegerValue(3, 0xb000a);
+    EXPECT_EQ(e->integerValueForField(0xb000a), 3);
+    EXPECT_TRUE(e->dataValueForField(0xb000a).empty());
+    EXPECT_EQ(e->fields().size(), 1u);
+}
+
+TEST(HIDEvent, KnownAndOtherFieldsAreListedTogetherInSelectorOrder) {
+    auto e = HIDEvent::create(kHIDEventTypeDigitizer, 0);
+    const uint8_t bytes[] = {1, 2};
+    e->setIntegerValue(1, 0x400000);                          // unknown type
+    e->setIntegerValue(2, kHIDEventFieldPointerButtonMask);  // 0x110003
+    e->setIntegerValue(3, 0xb001c);                          // unknown digitizer index
+    e->setIntegerValue(4, kHIDEventFieldDigitizerGenerationCount);
+    e->setIntegerValue(5, 0xb000a);
+    e->setDoubleValue(0.25, kHIDEventFieldDigitizerX);
+    e->setDataValue(bytes, 2, kHIDEventFieldVendorDefinedData);
+    e->setIntegerValue(6, kHIDEventFieldVendorDefinedUsagePage);
+    e->setIntegerValue(7, 0x5);
+    const std::vector<uint32_t> expected = {0x5,     0x10000, 0x10004, 0xb0000, 0xb000a,
+                                            0xb001b, 0xb001c, 0x110003, 0x400000};
+    ASSERT_EQ(e->fields().size(), expected.size());
+    for (size_t i = 0; i < expected.size(); ++i) EXPECT_EQ(e->fields()[i].selector, expected[i]) << i;
+    EXPECT_EQ(e->description(),
+              "{type 11 ts 0 sender 0 phase 0 0x5=7 0x10000=6 0x10004=<0102> 0xb0000=0.25 0xb000a=5 0xb001b=4 "
+              "0xb001c=3 0x110003=2 0x400000=1}");
+}
+
+TEST(HIDEvent, TheListOfFieldsFollowsEveryChange) {
+    auto e = HIDEvent::create(kHIDEventTypeDigitizer, 0);
+    const std::vector<HIDEvent::Field>& list = e->fields();
+    EXPECT_TRUE(list.empty());
+    e->setIntegerValue(1, kHIDEventFieldDigitizerTouch);
+    EXPECT_EQ(&e->fields(), &list);  // the same storage, listed again
+    ASSERT_EQ(list.size(), 1u);
+    EXPECT_EQ(list[0].integer, 1);
+    e->setIntegerValue(0, kHIDEventFieldDigitizerTouch);
+    EXPECT_EQ(e->fields()[0].integer, 0);
+    e->setDoubleValue(0.5, 0xb0042);
+    ASSERT_EQ(e->fields().size(), 2u);
+    EXPECT_EQ(e->fields()[1].real, 0.5);
+    auto copy = e->copy();
+    ASSERT_EQ(copy->fields().size(), 2u);
+    EXPECT_EQ(copy->fields()[1].selector, 0xb0042u);
+}
+
+TEST(HIDEvent, ManyFieldsAtOnceAllReadBackInOrder) {
+    auto e = HIDEvent::create(kHIDEventTypeDigitizer, 0);
+    const std::vector<uint32_t> known = knownSelectors();
+    std::vector<uint32_t> all = known;
+    for (uint32_t i = 0; i < 60; ++i) all.push_back(0x300000 + i * 0x3001);  // unknown, among none of the known
+    // Written from the highest selector down, each the index of its place.
+    std::vector<uint32_t> sorted = all;
+    std::sort(sorted.begin(), sorted.end());
+    for (size_t i = sorted.size(); i-- > 0;) {
+        const uint8_t byte = static_cast<uint8_t>(i);
+        if (sorted[i] == kHIDEventFieldVendorDefinedData) {
+            e->setDataValue(&byte, 1, sorted[i]);
+        } else {
+            e->setIntegerValue(static_cast<int64_t>(i), sorted[i]);
+        }
+    }
+    ASSERT_EQ(e->fields().size(), sorted.size());
+    for (size_t i = 0; i < sorted.size(); ++i) {
+        EXPECT_EQ(e->fields()[i].selector, sorted[i]);
+        if (sorted[i] != kHIDEventFieldVendorDefinedData) {
+            EXPECT_EQ(e->integerValueForField(sorted[i]), static_cast<int64_t>(i));
+        }
+    }
+    auto copy = e->copy();
+    EXPECT_EQ(copy->description(), e->description());
 }
