@@ -107,11 +107,6 @@ int HIDPathStateBasic::getNumberOfContacts(const HIDEventRef& frame) const {
     return count;
 }
 
-HIDParserPath* HIDPathStateBasic::getParserPath(int slot) const {
-    if (slot < 0 || slot >= static_cast<int>(paths_.size())) return nullptr;
-    return paths_[static_cast<size_t>(slot)].get();
-}
-
 HIDParserPath* HIDPathStateBasic::findParserPathforPathIDBySearch(int pathID) const {
     if (pathID == 0) return nullptr;
     for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) {

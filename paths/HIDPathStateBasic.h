@@ -30,7 +30,10 @@ public:
     void expandAndFilterPackedContacts(const HIDEventRef& frame);
     int getNumberOfContacts(const HIDEventRef& frame) const;
     // The path at a slot; nullptr outside the table.
-    HIDParserPath* getParserPath(int slot) const;
+    HIDParserPath* getParserPath(int slot) const {
+        if (slot < 0 || slot >= static_cast<int>(paths_.size())) return nullptr;
+        return paths_[static_cast<size_t>(slot)].get();
+    }
     // The first path of slots 1..14 whose current contact has this ID; nullptr for none (and for 0).
     HIDParserPath* getParserPathforPathID(int pathID) const {
         // A cleared path has ID 0; it is never found.

@@ -65,6 +65,16 @@ float sortLengthOf(HIDPoint p) {
     return static_cast<float>(std::sqrt(x * x + y * y));
 }
 
+// The cosine of the angle between two velocities as getCosineThetas works it out.
+float cosineBetween(HIDPoint a, HIDPoint b) {
+    const float lengthA = lengthOf(a);
+    const float lengthB = lengthOf(b);
+    if (lengthA == 0.0f || lengthB == 0.0f) return 1.0f;
+    const double dot = static_cast<double>(a.x) * b.x + static_cast<double>(a.y) * b.y;
+    const double lengths = static_cast<double>(lengthA) * static_cast<double>(lengthB);
+    return static_cast<float>(dot / lengths);
+}
+
 // Orders velocities by sortLengthOf, keeping the order of equal lengths. Any stable sort
 // gives the same order when no length is NaN, and an insertion sort needs no buffer from the
 // heap; with a NaN among them the order depends on the algorithm, so the library's is used.
@@ -232,6 +242,15 @@ void HIDPathStates::updateSpeedSymmetriesOfAllPaths() {
         }
     });
 
+    if (numFingers == 2 && !verboseDebugEnabled()) {
+        // Two fingers: each one's symmetry is against the other alone, and the cosine between
+        // them is the same both ways round (the products and their sums are the same numbers).
+        const float cosine = cosineBetween(velocities[0], velocities[1]);
+        fingers[0]->set_2F_speed_symmetry(twoFingerSymmetry(speeds[0], speeds[1], cosine));
+        fingers[1]->set_2F_speed_symmetry(twoFingerSymmetry(speeds[1], speeds[0], cosine));
+        return;
+    }
+
     std::array<HIDPoint, kMaxPaths> otherVelocities;
     std::array<float, kMaxPaths> otherSpeeds;
     for (size_t k = 0; k < numFingers; ++k) {
@@ -295,18 +314,7 @@ float HIDPathStates::speedSymmetryAmongFingers(HIDPoint desiredVelocity, float d
     // one between the two fingers) is read. The cosines are logged as they are worked out, so
     // with the diagnostics on every one is.
     if (numOthers == 1 && !verboseDebugEnabled()) {
-        if (!(desiredSpeed > 0.0f)) return 0.0f;
-        float cosine = 1.0f;
-        const float lengthA = lengthOf(desiredVelocity);
-        const float lengthB = lengthOf(otherVelocities[0]);
-        if (lengthA != 0.0f && lengthB != 0.0f) {
-            const double dot = static_cast<double>(desiredVelocity.x) * otherVelocities[0].x +
-                               static_cast<double>(desiredVelocity.y) * otherVelocities[0].y;
-            const double lengths = static_cast<double>(lengthA) * static_cast<double>(lengthB);
-            cosine = static_cast<float>(dot / lengths);
-        }
-        return compute_2F_path_speed_symmetry(std::span<const float>(otherSpeeds, 1), std::span<const float>(&cosine, 1),
-                                              desiredSpeed);
+        return twoFingerSymmetry(desiredSpeed, otherSpeeds[0], cosineBetween(desiredVelocity, otherVelocities[0]));
     }
     return speedSymmetryAmongFingersInFull(desiredVelocity, desiredSpeed, otherVelocities, otherSpeeds, numOthers);
 }
@@ -336,6 +344,12 @@ float HIDPathStates::speedSymmetryAmongFingersInFull(HIDPoint desiredVelocity, f
                                               std::span<const float>(cosines.data(), numCosines), desiredSpeed);
     }
     return 0.0f;
+}
+
+float HIDPathStates::twoFingerSymmetry(float desiredSpeed, float otherSpeed, float cosine) {
+    if (!(desiredSpeed > 0.0f)) return 0.0f;
+    return compute_2F_path_speed_symmetry(std::span<const float>(&otherSpeed, 1), std::span<const float>(&cosine, 1),
+                                          desiredSpeed);
 }
 
 float HIDPathStates::compute_2F_path_speed_symmetry(std::span<const float> speeds, std::span<const float> cosineThetas,

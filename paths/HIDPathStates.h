@@ -56,6 +56,8 @@ public:
     static float speedSymmetryAmongFingers(HIDPoint desiredVelocity, float desiredSpeed,
                                            const HIDPoint* otherVelocities, const float* otherSpeeds,
                                            size_t numOthers);
+    // The symmetry of a finger with exactly one other finger, given the cosine between them.
+    static float twoFingerSymmetry(float desiredSpeed, float otherSpeed, float cosine);
     // The same, always sorting the other fingers and working out every cosine.
     static float speedSymmetryAmongFingersInFull(HIDPoint desiredVelocity, float desiredSpeed,
                                                  const HIDPoint* otherVelocities, const float* otherSpeeds,

@@ -142,5 +142,43 @@ TEST(SpeedSymmetry, OneOtherFingerGivesWhatTheFullWorkingGivesForEveryKindOfValu
     EXPECT_GT(negative, 10000);  // fingers moving apart, whose cosine is negative, were among them
 }
 
+// Two fingers on the table: each one's symmetry comes from the one cosine between them, which
+// is the same both ways round; for every kind of velocity and speed it is what the full
+// working gives for each finger against the other.
+TEST(SpeedSymmetry, TwoFingersShareTheirCosineAndGetWhatTheFullWorkingGives) {
+    const float nan = std::numeric_limits<float>::quiet_NaN();
+    const float inf = std::numeric_limits<float>::infinity();
+    const std::array<float, 12> values{0.0f, -0.0f, 0.25f, -0.25f, 0.75f, 1.0f, -1.0f, 3.5f, -7.0f, 1e30f, inf, nan};
+    std::mt19937 random(99);
+    auto value = [&] { return values[std::uniform_int_distribution<size_t>(0, values.size() - 1)(random)]; };
+    HIDPathStates table(500.0f, 1000.0f);
+    int differences = 0;
+    int negative = 0;
+    for (int step = 0; step < 50000; ++step) {
+        for (int s = 1; s <= 2; ++s) {
+            HIDParserPath* path = table.getParserPath(s);
+            HIDContact c = path->currentContact();
+            c.fingerTipSwitch = 1;
+            c.fingerConfidence = 1;
+            c.path_id = s;
+            path->setCurrentContact(c);
+            path->setDampedVelocity(HIDPoint{value(), value()});
+            path->setDampedSpeed(step % 3 == 0 ? value() : std::fabs(value()));
+        }
+        const HIDParserPath* a = table.getParserPath(1);
+        const HIDParserPath* b = table.getParserPath(2);
+        const HIDPoint va = a->dampedVelocity(), vb = b->dampedVelocity();
+        const float sa = a->dampedSpeed(), sb = b->dampedSpeed();
+        const float expectedA = HIDPathStates::speedSymmetryAmongFingersInFull(va, sa, &vb, &sb, 1);
+        const float expectedB = HIDPathStates::speedSymmetryAmongFingersInFull(vb, sb, &va, &sa, 1);
+        table.updateSpeedSymmetriesOfAllPaths();
+        if (bitsOf(a->_2F_speed_symmetry()) != bitsOf(expectedA)) ++differences;
+        if (bitsOf(b->_2F_speed_symmetry()) != bitsOf(expectedB)) ++differences;
+        if (expectedA < 0.0f) ++negative;
+    }
+    EXPECT_EQ(differences, 0);
+    EXPECT_GT(negative, 2000);
+}
+
 }  // namespace
 }  // namespace orvane
