@@ -269,8 +269,9 @@ void HIDHandMotion::extractHandMotionWithResting(const HIDPathStates&, HIDParser
 // ---------------------------------------------------------------------------------------
 // The per-frame entry
 
-void HIDHandMotion::processHandMotion(HIDPathStates& pathTable, int32_t nTouching, int32_t lastnTouching,
-                                      uint32_t /*touchingMask*/) {
+// Flattened: the steps below are inlined into this one per-frame entry.
+[[gnu::flatten]] void HIDHandMotion::processHandMotion(HIDPathStates& pathTable, int32_t nTouching,
+                                                       int32_t lastnTouching, uint32_t /*touchingMask*/) {
     updateFingerPathMappings(pathTable);
 
     if (pathTable.restingThumbExists() != pathTable.restingThumbDidExist() ||
