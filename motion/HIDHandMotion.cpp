@@ -55,14 +55,6 @@ bool formsPair(const HIDParserPath* outermostPath, const HIDContact& innermostCu
     return outermostPath != nullptr && outermostCur.path_id != 0 && outermostCur.path_id != innermostCur.path_id;
 }
 
-float largestMagnitude(const HIDMotion& m) {
-    float largest = std::fabs(m.x);
-    if (std::fabs(m.y) > largest) largest = std::fabs(m.y);
-    if (std::fabs(m.scale) > largest) largest = std::fabs(m.scale);
-    if (std::fabs(m.rotate) > largest) largest = std::fabs(m.rotate);
-    return largest;
-}
-
 float applyDeadZone(float c) {
     if (std::fabs(c) < kClippedVelocityDeadZone) return 0.0f;
     return c > 0.0f ? c - kClippedVelocityDeadZone : c + kClippedVelocityDeadZone;
@@ -217,10 +209,14 @@ void HIDHandMotion::extractHandMotion(const HIDPathStates& pathTable, HIDParserP
                 pixelDeltas_.scale = s.magnitude - previousSeparation;
                 pixelDeltas_.rotate = rotationFromVectorProduct(u, di, dO);
 
-                logVerbose("%s GESTURE : separation %f - previous_sep %f", kSig, s.magnitude, previousSeparation);
-                logVerbose("%s GESTURE : normalized separation (%f,%f)  delta_innermost (%f,%f) delta_outermost "
-                           "(%f,%f)",
-                           kSig, u.x, u.y, di.x, di.y, dO.x, dO.y);
+                // One test of the log level for both lines when it is off.
+                if (verboseDebugEnabled()) {
+                    logVerbose("%s GESTURE : separation %f - previous_sep %f", kSig, s.magnitude,
+                               previousSeparation);
+                    logVerbose("%s GESTURE : normalized separation (%f,%f)  delta_innermost (%f,%f) "
+                               "delta_outermost (%f,%f)",
+                               kSig, u.x, u.y, di.x, di.y, dO.x, dO.y);
+                }
             }
         }
     } else {
@@ -269,8 +265,9 @@ void HIDHandMotion::extractHandMotionWithResting(const HIDPathStates&, HIDParser
 // ---------------------------------------------------------------------------------------
 // The per-frame entry
 
-void HIDHandMotion::processHandMotion(HIDPathStates& pathTable, int32_t nTouching, int32_t lastnTouching,
-                                      uint32_t /*touchingMask*/) {
+// Flattened: the steps below are inlined into this one per-frame entry.
+[[gnu::flatten]] void HIDHandMotion::processHandMotion(HIDPathStates& pathTable, int32_t nTouching,
+                                                       int32_t lastnTouching, uint32_t /*touchingMask*/) {
     updateFingerPathMappings(pathTable);
 
     if (pathTable.restingThumbExists() != pathTable.restingThumbDidExist() ||
@@ -493,6 +490,8 @@ void HIDHandMotion::clearHandMotion(bool clearLocation) {
 
 void HIDHandMotion::printExtractedMotion(int numFingers) const {
     static const char* kSig = "-[HIDHandMotion printExtractedMotion:]";
+    // One test of the log level for both lines when it is off.
+    if (!verboseDebugEnabled()) return;
     logVerbose("%s Motion %dM, %d<-->%d\n", kSig, numFingers, innermostTouchingFingerID(),
                outermostTouchingFingerID());
     logVerbose("%s Motion \t%4.2fdx %4.2fdy %4.2fds %4.2fdr | %5.3f/%5.3fvx %5.3f/%5.3fvy %5.3f/%5.3fvs "
@@ -501,16 +500,5 @@ void HIDHandMotion::printExtractedMotion(int numFingers) const {
                smoothedClippedVelocity_.x, velocity_.x, smoothedClippedVelocity_.y, velocity_.y,
                smoothedClippedVelocity_.scale, velocity_.scale, smoothedClippedVelocity_.rotate, velocity_.rotate);
 }
-
-bool HIDHandMotion::anyPixelDeltas() const {
-    return pixelDeltas_.x != 0.0f || pixelDeltas_.y != 0.0f || pixelDeltas_.scale != 0.0f ||
-           pixelDeltas_.rotate != 0.0f;
-}
-
-float HIDHandMotion::maxPixelDelta() const { return largestMagnitude(pixelDeltas_); }
-
-float HIDHandMotion::maxAccumPixelDelta() const { return largestMagnitude(accumulatedDeltas_); }
-
-float HIDHandMotion::maxAccumPixelDeltaResting() const { return largestMagnitude(accumulatedDeltasWithResting_); }
 
 }  // namespace orvane

@@ -3,6 +3,7 @@
 // scale and rotation, smoothed, clipped to the dominant kind and accumulated, and written
 // back into the path table.
 
+#include <cmath>
 #include <cstdint>
 #include <limits>
 
@@ -57,10 +58,14 @@ public:
     void clipMotionToDominantAxes(double frameInterval);
     void computeTrackpadDominanceWeights(float& scaleDominanceWeight, float& rotationDominanceWeight) const;
     void printExtractedMotion(int numFingers) const;
-    bool anyPixelDeltas() const;
-    float maxPixelDelta() const;
-    float maxAccumPixelDelta() const;
-    float maxAccumPixelDeltaResting() const;
+    // Inline, as the gesture stage asks for these on every frame.
+    bool anyPixelDeltas() const {
+        return pixelDeltas_.x != 0.0f || pixelDeltas_.y != 0.0f || pixelDeltas_.scale != 0.0f ||
+               pixelDeltas_.rotate != 0.0f;
+    }
+    float maxPixelDelta() const { return largestMagnitude(pixelDeltas_); }
+    float maxAccumPixelDelta() const { return largestMagnitude(accumulatedDeltas_); }
+    float maxAccumPixelDeltaResting() const { return largestMagnitude(accumulatedDeltasWithResting_); }
 
     HID_PROPERTY(HIDMotion, pixelDeltas, setPixelDeltas)
     HID_PROPERTY(HIDMotion, velocity, setVelocity)
@@ -94,6 +99,14 @@ public:
     HID_PROPERTY(HIDMotion, velocity_mm_s, setVelocity_mm_s)
 
 private:
+    // The largest of the four magnitudes, compared in this order.
+    static float largestMagnitude(const HIDMotion& m) {
+        float largest = std::fabs(m.x);
+        if (std::fabs(m.y) > largest) largest = std::fabs(m.y);
+        if (std::fabs(m.scale) > largest) largest = std::fabs(m.scale);
+        if (std::fabs(m.rotate) > largest) largest = std::fabs(m.rotate);
+        return largest;
+    }
     // The separations of computeSeparation_mm from the vertical difference and the magnitude.
     void noteSeparation_mm(float dy, float magnitude);
 

@@ -1,7 +1,9 @@
 // The hand motion's faster forms agree with the plain ones:
-// - the finger-to-path map built over only the paths that can take part agrees with asking
-//   the table for every ID in turn, on every frame of the random sessions and on random
-//   tables with finger IDs repeated, out of range, in others' slots or none;
+// - the finger-to-path map built over only the paths that can take part, clearing only the
+//   entries the last mapping set, agrees with clearing every entry and asking the table for
+//   every ID in turn, on every frame of the random sessions and on random tables with finger
+//   IDs repeated, out of range, in others' slots or none; and every entry outside the set of
+//   mapped finger IDs is 0;
 // - the separation without its direction has the same x, y and magnitude as the full one;
 // - the WithResting extraction of the plain view's pair gives the plain deltas bit for bit,
 //   so a frame whose views picked the same pair shares them;
@@ -47,6 +49,18 @@ std::string mapStateOf(const HIDFingerToPathMap& m) {
            num(m.outermostTouchingFingerIDWithResting());
 }
 
+// "" when every entry of both maps outside mappedFingerIDs is 0 and every one in it is not.
+std::string unmappedEntriesOf(const HIDFingerToPathMap& m) {
+    std::string s;
+    for (uint32_t id = 0; id < HIDFingerToPathMap::kNumFingerIDs; ++id) {
+        const bool mapped = (m.mappedFingerIDs() >> id & 1u) != 0;
+        const bool plainSet = m.fingersToPathIDs()[id] != 0;
+        const bool restingSet = m.fingersToPathIDsWithResting()[id] != 0;
+        if (plainSet != mapped || restingSet != mapped) s += num(static_cast<int>(id));
+    }
+    return s.empty() ? s : "entries against the mask: " + s;
+}
+
 // Both forms from the same map and table; "" when they agree.
 std::string mapDifferenceOf(const HIDFingerToPathMap& map, const HIDPathStateBasic& table) {
     HIDFingerToPathMap plain = map;
@@ -55,7 +69,11 @@ std::string mapDifferenceOf(const HIDFingerToPathMap& map, const HIDPathStateBas
     walked.updateFingerPathMappings(table);
     const std::string a = mapStateOf(plain);
     const std::string b = mapStateOf(walked);
-    return a == b ? std::string() : "one by one: " + a + "\nwalked:     " + b;
+    if (a != b) return "one by one: " + a + "\nwalked:     " + b;
+    const std::string before = unmappedEntriesOf(map);
+    if (!before.empty()) return "before: " + before;
+    const std::string after = unmappedEntriesOf(walked);
+    return after.empty() ? after : "after: " + after;
 }
 
 const HIDContact kNoContact{};
@@ -141,6 +159,7 @@ TEST(HandMotionForms, MapWalkAgreesWithEveryIDInTurnOnRandomTables) {
     HIDFingerToPathMap map;
     int differences = 0;
     int crowded = 0;
+    int staleCleared = 0;
     std::string first;
     for (int step = 0; step < 5000; ++step) {
         for (int s = 1; s < HIDPathStateBasic::kNumPaths; ++s) {
@@ -157,12 +176,16 @@ TEST(HandMotionForms, MapWalkAgreesWithEveryIDInTurnOnRandomTables) {
         }
         const std::string d = mapDifferenceOf(map, table);
         if (!d.empty() && differences++ == 0) first = d;
+        const uint32_t before = map.mappedFingerIDs();
         map.updateFingerPathMappings(table);
+        // Entries of the last mapping that this one does not set again are the ones cleared.
+        if ((before & ~map.mappedFingerIDs()) != 0) ++staleCleared;
         if (map.numFingersTouching() >= 8) ++crowded;
         if (pick(0, 49) == 0) map.clearFingerPathMappings();
     }
     EXPECT_EQ(differences, 0) << first;
     EXPECT_GT(crowded, 500);
+    EXPECT_GT(staleCleared, 500);
 }
 
 TEST(HandMotionForms, SeparationWithoutDirectionKeepsTheOtherParts) {
