@@ -34,7 +34,7 @@ HIDPathStateBasic::~HIDPathStateBasic() {
     for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) paths_[slot]->linkToTable(-1, nullptr);
 }
 
-bool HIDPathStateBasic::unpackContactFrame(const HIDEventRef& frame, double time) {
+[[gnu::flatten]] bool HIDPathStateBasic::unpackContactFrame(const HIDEventRef& frame, double time) {
     updateFrameTimestamp(time);
     if (frame) {
         // Clearing paths leaves the frame as it is, so both steps see the same contact count.

@@ -130,7 +130,7 @@ void HIDPathStates::updateDivingBoardDisplacements() {
     });
 }
 
-void HIDPathStates::postFilteringTasks(const HIDEventRef& frame) {
+[[gnu::flatten]] void HIDPathStates::postFilteringTasks(const HIDEventRef& frame) {
     checkForRestingThumb();
     // The thumb-zone decision never changes in a frame where a finger touches down or lifts.
     if (!makeOrBreakTouchHappened(frame)) {
@@ -319,7 +319,7 @@ float HIDPathStates::speedSymmetryAmongFingers(HIDPoint desiredVelocity, float d
     return speedSymmetryAmongFingersInFull(desiredVelocity, desiredSpeed, otherVelocities, otherSpeeds, numOthers);
 }
 
-float HIDPathStates::speedSymmetryAmongFingersInFull(HIDPoint desiredVelocity, float desiredSpeed,
+[[gnu::noinline]] float HIDPathStates::speedSymmetryAmongFingersInFull(HIDPoint desiredVelocity, float desiredSpeed,
                                                      const HIDPoint* otherVelocities, const float* otherSpeeds,
                                                      size_t numOthers) {
     // Slot 0 of the velocities is kept for the desired path's own velocity.
