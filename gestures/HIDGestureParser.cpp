@@ -104,7 +104,7 @@ void HIDGestureParser::fillParentDigitizerFields(HIDEvent& parent) const {
     parent.setDoubleValue(1.0 - parent.doubleValueForField(kHIDEventFieldDigitizerY), kHIDEventFieldDigitizerY);
 }
 
-HIDEventRef HIDGestureParser::prepareHandEventforUI(HIDHandStatistics& handStats, const HIDEventRef& frame) {
+[[gnu::flatten]] HIDEventRef HIDGestureParser::prepareHandEventforUI(HIDHandStatistics& handStats, const HIDEventRef& frame) {
     int remaining = handStats.numPaths();
     handStats.setWerePalmsRemoved(handStats.palmsRemoved());
     handStats.setPalmsRemoved(false);
@@ -169,7 +169,7 @@ HIDEventRef HIDGestureParser::prepareHandEventforUI(HIDHandStatistics& handStats
 // ---------------------------------------------------------------------------------------
 // The recogniser
 
-HIDEventRef HIDGestureParser::parseHandGesturesCreateHIDEvents(HIDHandStatistics& handStats, HIDHandMotion& handMotion,
+[[gnu::flatten]] HIDEventRef HIDGestureParser::parseHandGesturesCreateHIDEvents(HIDHandStatistics& handStats, HIDHandMotion& handMotion,
                                                                const HIDEventRef& handEvent,
                                                                const HIDDispatchHandler& dispatcher,
                                                                bool tapToClickEnabled,

@@ -16,7 +16,7 @@ HIDParser::HIDParser(HIDDispatchHandler dispatchHandler, float height, float wid
 
 HIDParser::~HIDParser() = default;
 
-HIDEventRef HIDParser::handleContactFrame(double timestamp, const HIDEventRef& baseEvent) {
+[[gnu::flatten]] HIDEventRef HIDParser::handleContactFrame(double timestamp, const HIDEventRef& baseEvent) {
     pathStates_->unpackContactFrame(baseEvent, timestamp);
     pathStates_->updateButtonState(baseEvent);
     pathStates_->postFilteringTasks(baseEvent);
