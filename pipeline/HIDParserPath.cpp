@@ -22,6 +22,24 @@ constexpr int64_t kPalmTransducerType = 3;
 
 float lengthOf(HIDPoint p) { return sqrtf(p.x * p.x + p.y * p.y); }
 
+constexpr const char* kFilterSignature = "-[HIDParserPath filterContactForScreenUI:]";
+
+// The diagnostics of the screen-UI filter, out of its way: each is called when
+// verboseDebugEnabled() and logs what logVerbose would.
+__attribute__((noinline, cold)) void logHysteresisMove(HIDPoint center, HIDPoint oldCenter, int32_t pathID) {
+    LoggingServiceFilterVerbose()->log(LogLevel::Debug,
+                                       "%s hysteresis center (%f,%f), pulled_hysteresis_center (%f,%f) path_id %d",
+                                       kFilterSignature, center.x, center.y, oldCenter.x, oldCenter.y, pathID);
+}
+
+__attribute__((noinline, cold)) void logFilteredContact(const HIDContact& cur, const HIDContact& prev,
+                                                        HIDPoint pixelDelta) {
+    LoggingServiceFilterVerbose()->log(
+        LogLevel::Debug, "%s Current position (%f,%f), Previous position (%f,%f) pixel delta (%f, %f) path_id %d",
+        kFilterSignature, cur.position.x, cur.position.y, prev.position.x, prev.position.y, pixelDelta.x,
+        pixelDelta.y, cur.path_id);
+}
+
 }  // namespace
 
 HIDParserPath::HIDParserPath(float height, float width)
@@ -201,18 +219,16 @@ inline void HIDParserPath::dampVelocity(bool strongDamping) {
 
 void HIDParserPath::filterContactForScreenUI(bool strongDamping) {
     link_.markDirty();
-    static constexpr const char* kSignature = "-[HIDParserPath filterContactForScreenUI:]";
     HIDContact& cur = currentContact_;
     const HIDContact& prev = previousContact_;
 
+    // The conditions of filterContactForScreenUILiteral, the cheaper ones asked first.
     const bool isNew = cur.fingerTipSwitch == 1 && prev.fingerTipSwitch == 0;
-    const bool hasPosition = cur.position.x != 0 || cur.position.y != 0;
-    const bool hadPosition = prev.position.x != 0 || prev.position.y != 0;
-    if (!isNew && hasPosition && hadPosition && cur.path_id == prev.path_id && cur.fingerTipSwitch != 0) {
+    if (cur.fingerTipSwitch != 0 && cur.path_id == prev.path_id && !isNew &&
+        (cur.position.x != 0 || cur.position.y != 0) && (prev.position.x != 0 || prev.position.y != 0)) {
         const HIDPoint oldCenter = hysteresisCenter_;
         applyAbsolutePixelHysteresis(cur.position, hysteresisCenter_, prev.position, kHysteresisRadius_mm);
-        logVerbose("%s hysteresis center (%f,%f), pulled_hysteresis_center (%f,%f) path_id %d", kSignature,
-                   hysteresisCenter_.x, hysteresisCenter_.y, oldCenter.x, oldCenter.y, cur.path_id);
+        if (verboseDebugEnabled()) [[unlikely]] logHysteresisMove(hysteresisCenter_, oldCenter, cur.path_id);
         pixelDelta_.x = hysteresisCenter_.x - oldCenter.x;
         pixelDelta_.y = hysteresisCenter_.y - oldCenter.y;
         cumulativeDeltas_.x += pixelDelta_.x;
@@ -233,14 +249,12 @@ void HIDParserPath::filterContactForScreenUI(bool strongDamping) {
     engagedSpeed_ = lengthOf(cur.velocity);
     // The table is marked above for the whole filter.
     dampVelocity(strongDamping);
-    logVerbose("%s Current position (%f,%f), Previous position (%f,%f) pixel delta (%f, %f) path_id %d", kSignature,
-               cur.position.x, cur.position.y, prev.position.x, prev.position.y, pixelDelta_.x, pixelDelta_.y,
-               cur.path_id);
+    if (verboseDebugEnabled()) [[unlikely]] logFilteredContact(cur, prev, pixelDelta_);
 }
 
 void HIDParserPath::filterContactForScreenUILiteral(bool strongDamping) {
     link_.markDirty();
-    static constexpr const char* kSignature = "-[HIDParserPath filterContactForScreenUI:]";
+    static constexpr const char* kSignature = kFilterSignature;
     HIDContact& cur = currentContact_;
     const HIDContact& prev = previousContact_;
 
