@@ -22,12 +22,80 @@ constexpr int64_t kPalmTransducerType = 3;
 
 float lengthOf(HIDPoint p) { return sqrtf(p.x * p.x + p.y * p.y); }
 
+constexpr const char* kFilterSignature = "-[HIDParserPath filterContactForScreenUI:]";
+
+// The diagnostics of the screen-UI filter, out of its way: each is called when
+// verboseDebugEnabled() and logs what logVerbose would.
+__attribute__((noinline, cold)) void logHysteresisMove(HIDPoint center, HIDPoint oldCenter, int32_t pathID) {
+    LoggingServiceFilterVerbose()->log(LogLevel::Debug,
+                                       "%s hysteresis center (%f,%f), pulled_hysteresis_center (%f,%f) path_id %d",
+                                       kFilterSignature, center.x, center.y, oldCenter.x, oldCenter.y, pathID);
+}
+
+__attribute__((noinline, cold)) void logFilteredContact(const HIDContact& cur, const HIDContact& prev,
+                                                        HIDPoint pixelDelta) {
+    LoggingServiceFilterVerbose()->log(
+        LogLevel::Debug, "%s Current position (%f,%f), Previous position (%f,%f) pixel delta (%f, %f) path_id %d",
+        kFilterSignature, cur.position.x, cur.position.y, prev.position.x, prev.position.y, pixelDelta.x,
+        pixelDelta.y, cur.path_id);
+}
+
 }  // namespace
 
 HIDParserPath::HIDParserPath(float height, float width)
     : surfaceDimensions_{width, height}, bounds_(EdgeBounds::of(surfaceDimensions_)) {}
 
+void HIDParserPath::setPeakDisplacement() {
+    link_.markDirty();
+    raisePeakDisplacement();
+}
+
+inline void HIDParserPath::raisePeakDisplacement() {
+    const HIDPoint d{currentContact_.position.x - initialPosition_.x, currentContact_.position.y - initialPosition_.y};
+    const float distance = lengthOf(d);
+    logVerbose("%s initial position (%f, %f) current (%f, %f)", "-[HIDParserPath setPeakDisplacement]",
+               initialPosition_.x, initialPosition_.y, currentContact_.position.x, currentContact_.position.y);
+    if (distance > peakDisplacement_) peakDisplacement_ = distance;
+}
+
 void HIDParserPath::updateCurPrevContactsWith(const HIDEvent& contact, double time) {
+    link_.markDirty();
+    previousContact_ = currentContact_;
+    currentContact_.device_timestamp = time;
+
+    currentContact_.fingerConfidence =
+        contact.integerValueForField(kHIDEventFieldDigitizerType) != kPalmTransducerType ? 1 : 0;
+    currentContact_.fingerTipSwitch = static_cast<int32_t>(contact.integerValueForField(kHIDEventFieldDigitizerTouch));
+    const int32_t index = static_cast<int32_t>(contact.integerValueForField(kHIDEventFieldDigitizerIndex));
+    // The finger ID is one more than the path ID, on purpose.
+    currentContact_.path_id = index + 1;
+    currentContact_.finger_id = index + 2;
+    link_.noteID(currentContact_.path_id);
+
+    const float x = static_cast<float>(contact.doubleValueForField(kHIDEventFieldDigitizerX));
+    const float y = static_cast<float>(contact.doubleValueForField(kHIDEventFieldDigitizerY));
+    currentContact_.position.x = x * surfaceDimensions_.x;
+    // Flipped, so that a larger y lies nearer the diving-button edge.
+    currentContact_.position.y = (1 - y) * surfaceDimensions_.y;
+
+    // Without a previous position the velocity keeps the value it already had.
+    if (previousContact_.position.x != 0 && previousContact_.position.y != 0) {
+        currentContact_.velocity.x = currentContact_.position.x - previousContact_.position.x;
+        currentContact_.velocity.y = currentContact_.position.y - previousContact_.position.y;
+    }
+
+    if (previousContact_.fingerTipSwitch == 0) {
+        initialPosition_ = currentContact_.position;
+        longTermPosition_ = currentContact_.position;
+        peakDisplacement_ = 0.0f;
+    }
+
+    // The table is marked above for the whole reading.
+    raisePeakDisplacement();
+    updatePathStageTimestamps(time);
+}
+
+void HIDParserPath::updateCurPrevContactsWithLiteral(const HIDEvent& contact, double time) {
     link_.markDirty();
     previousContact_ = currentContact_;
     currentContact_.device_timestamp = time;
@@ -81,15 +149,6 @@ void HIDParserPath::updatePathStageTimestamps(double time) {
     }
 }
 
-void HIDParserPath::setPeakDisplacement() {
-    link_.markDirty();
-    const HIDPoint d{currentContact_.position.x - initialPosition_.x, currentContact_.position.y - initialPosition_.y};
-    const float distance = lengthOf(d);
-    logVerbose("%s initial position (%f, %f) current (%f, %f)", "-[HIDParserPath setPeakDisplacement]",
-               initialPosition_.x, initialPosition_.y, currentContact_.position.x, currentContact_.position.y);
-    if (distance > peakDisplacement_) peakDisplacement_ = distance;
-}
-
 bool HIDParserPath::applyMinimumIncrementHysteresis(float value, float& center, float prevValueQuantized,
                                                     float hysteresisRadius) {
     const float diff = value - center;
@@ -123,9 +182,79 @@ bool HIDParserPath::applyAbsolutePixelHysteresis(HIDPoint value, HIDPoint& hyste
     return movedX || movedY;
 }
 
+void HIDParserPath::updateDampedVelocity(bool strongDamping) {
+    link_.markDirty();
+    dampVelocity(strongDamping);
+}
+
+void HIDParserPath::updateDampingWeights(float dt) {
+    const double dt_ms = ticksToMilliseconds(static_cast<double>(dt));
+    const double exponent = -dt_ms / kDampingHalfLife_ms;
+    dampingKeep_ = static_cast<float>(std::pow(2.0, exponent));
+    dampingInterval_ = dt;
+}
+
+inline void HIDParserPath::dampVelocity(bool strongDamping) {
+    const bool lifted = isMakeStage();
+    if (lifted || strongDamping) {
+        const float factor = lifted ? 0.0f : kStrongDampingFactor;
+        dampedVelocity_.x *= factor;
+        dampedVelocity_.y *= factor;
+        dampedSpeed_ *= factor;
+    }
+
+    const float dt = previousContact_.device_timestamp == 0
+                         ? 0.0f
+                         : static_cast<float>(currentContact_.device_timestamp - previousContact_.device_timestamp);
+    // Frames mostly come at one interval, so the weights are worked out again only when the
+    // interval changes: one interval always gives one exponent, and 2 to the power of 0 and
+    // of -0 are both 1. A NaN interval equals nothing and is worked out every time.
+    if (!(dt == dampingInterval_)) [[unlikely]] updateDampingWeights(dt);
+
+    const float k = dampingKeep_;
+    dampedVelocity_.x = dampedVelocity_.x * k + currentContact_.velocity.x * (1 - k);
+    dampedVelocity_.y = dampedVelocity_.y * k + currentContact_.velocity.y * (1 - k);
+    dampedSpeed_ = lengthOf(dampedVelocity_);
+}
+
 void HIDParserPath::filterContactForScreenUI(bool strongDamping) {
     link_.markDirty();
-    static constexpr const char* kSignature = "-[HIDParserPath filterContactForScreenUI:]";
+    HIDContact& cur = currentContact_;
+    const HIDContact& prev = previousContact_;
+
+    // The conditions of filterContactForScreenUILiteral, the cheaper ones asked first.
+    const bool isNew = cur.fingerTipSwitch == 1 && prev.fingerTipSwitch == 0;
+    if (cur.fingerTipSwitch != 0 && cur.path_id == prev.path_id && !isNew &&
+        (cur.position.x != 0 || cur.position.y != 0) && (prev.position.x != 0 || prev.position.y != 0)) {
+        const HIDPoint oldCenter = hysteresisCenter_;
+        applyAbsolutePixelHysteresis(cur.position, hysteresisCenter_, prev.position, kHysteresisRadius_mm);
+        if (verboseDebugEnabled()) [[unlikely]] logHysteresisMove(hysteresisCenter_, oldCenter, cur.path_id);
+        pixelDelta_.x = hysteresisCenter_.x - oldCenter.x;
+        pixelDelta_.y = hysteresisCenter_.y - oldCenter.y;
+        cumulativeDeltas_.x += pixelDelta_.x;
+        cumulativeDeltas_.y += pixelDelta_.y;
+        // Every later stage sees the steadied position.
+        cur.position = hysteresisCenter_;
+    } else {
+        previousStablePositionForUI_ = stablePositionForUI_;
+        hysteresisCenter_ = cur.position;
+        stablePositionForUI_ = cur.position;
+        pixelDelta_ = HIDPoint{0.0f, 0.0f};
+        cumulativeDeltas_ = HIDPoint{0.0f, 0.0f};
+        initialPosition_ = cur.position;
+        longTermPosition_ = cur.position;
+    }
+
+    engagedVelocity_ = cur.velocity;
+    engagedSpeed_ = lengthOf(cur.velocity);
+    // The table is marked above for the whole filter.
+    dampVelocity(strongDamping);
+    if (verboseDebugEnabled()) [[unlikely]] logFilteredContact(cur, prev, pixelDelta_);
+}
+
+void HIDParserPath::filterContactForScreenUILiteral(bool strongDamping) {
+    link_.markDirty();
+    static constexpr const char* kSignature = kFilterSignature;
     HIDContact& cur = currentContact_;
     const HIDContact& prev = previousContact_;
 
@@ -155,13 +284,13 @@ void HIDParserPath::filterContactForScreenUI(bool strongDamping) {
 
     engagedVelocity_ = cur.velocity;
     engagedSpeed_ = lengthOf(cur.velocity);
-    updateDampedVelocity(strongDamping);
+    updateDampedVelocityLiteral(strongDamping);
     logVerbose("%s Current position (%f,%f), Previous position (%f,%f) pixel delta (%f, %f) path_id %d", kSignature,
                cur.position.x, cur.position.y, prev.position.x, prev.position.y, pixelDelta_.x, pixelDelta_.y,
                cur.path_id);
 }
 
-void HIDParserPath::updateDampedVelocity(bool strongDamping) {
+void HIDParserPath::updateDampedVelocityLiteral(bool strongDamping) {
     link_.markDirty();
     const bool lifted = isMakeStage();
     if (lifted || strongDamping) weakenDampedVelocity(lifted ? 0.0f : kStrongDampingFactor);
@@ -170,14 +299,8 @@ void HIDParserPath::updateDampedVelocity(bool strongDamping) {
                          ? 0.0f
                          : static_cast<float>(currentContact_.device_timestamp - previousContact_.device_timestamp);
     const double dt_ms = ticksToMilliseconds(static_cast<double>(dt));
-    // Frames mostly come at one interval, so the power is worked out again only when the
-    // exponent changes (2 to the power of 0 and of -0 are both 1).
     const double exponent = -dt_ms / kDampingHalfLife_ms;
-    if (!(exponent == dampingExponent_)) {
-        dampingPower_ = std::pow(2.0, exponent);
-        dampingExponent_ = exponent;
-    }
-    const float k = static_cast<float>(dampingPower_);
+    const float k = static_cast<float>(std::pow(2.0, exponent));
 
     dampedVelocity_.x = dampedVelocity_.x * k + currentContact_.velocity.x * (1 - k);
     dampedVelocity_.y = dampedVelocity_.y * k + currentContact_.velocity.y * (1 - k);

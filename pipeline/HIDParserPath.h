@@ -39,6 +39,10 @@ public:
 
     // Reads one contact (a child digitizer event) of a frame at time t.
     void updateCurPrevContactsWith(const HIDEvent& contact, double time);
+    // The same reading step by step through the public steps (setPeakDisplacement,
+    // updatePathStageTimestamps), each marking the table on its own: the reference the
+    // reading above is held to.
+    void updateCurPrevContactsWithLiteral(const HIDEvent& contact, double time);
 
     // Stage tests. isMakeStage and isLiftOffStage are deliberately reversed from their
     // plain reading: make is true on the frame of lifting, lift-off on touch-down.
@@ -117,9 +121,14 @@ public:
 
     // The screen-UI position filter.
     void filterContactForScreenUI(bool strongDamping);
+    // The same filter through updateDampedVelocityLiteral: the reference for the one above.
+    void filterContactForScreenUILiteral(bool strongDamping);
     static bool applyAbsolutePixelHysteresis(HIDPoint value, HIDPoint& hysteresisCenter, HIDPoint prevValueQuantized,
                                              float hysteresisRadius);
     void updateDampedVelocity(bool strongDamping);
+    // The same damping with the power of two worked out on every call, through
+    // weakenDampedVelocity: the reference for the one above.
+    void updateDampedVelocityLiteral(bool strongDamping);
     void weakenDampedVelocity(float factor);
     bool fingerLiftoffNearEdgeframeInterval() const;
     HIDPoint getAverageVelocity_mm_s() const {
@@ -233,9 +242,18 @@ private:
     HIDPoint engagedVelocity_{};
     HIDPoint dampedVelocity_{};
     HIDPathTimestamps timestamps_{};
-    // The last damping exponent and its power of two.
-    double dampingExponent_ = std::numeric_limits<double>::quiet_NaN();
-    double dampingPower_ = 0.0;
+    // The frame interval (ticks, in float) the damping weight below was worked out for, and
+    // that weight: the power of two of the interval's exponent, in float. NaN equals no
+    // interval, so the first damping works it out.
+    float dampingInterval_ = std::numeric_limits<float>::quiet_NaN();
+    float dampingKeep_ = 0.0f;
+
+    // The steps of setPeakDisplacement and updateDampedVelocity without marking the table,
+    // for callers that have marked it already.
+    void raisePeakDisplacement();
+    void dampVelocity(bool strongDamping);
+    // Works out the damping weight for a new frame interval.
+    void updateDampingWeights(float dt);
 };
 
 }  // namespace orvane
