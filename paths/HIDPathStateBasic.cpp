@@ -25,7 +25,10 @@ constexpr float kDivingPairMaxHorizontalGap_mm = 30.0f;
 
 HIDPathStateBasic::HIDPathStateBasic(float height, float width) {
     paths_.reserve(kNumPaths);
-    for (int i = 0; i < kNumPaths; ++i) paths_.push_back(HIDParserPath::initWithHeight(height, width));
+    for (int i = 0; i < kNumPaths; ++i) {
+        paths_.push_back(HIDParserPath::initWithHeight(height, width));
+        slots_[static_cast<size_t>(i)] = paths_.back().get();
+    }
     for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) paths_[slot]->linkToTable(slot, &marks_);
 }
 
@@ -55,7 +58,7 @@ void HIDPathStateBasic::clearExistingPathLiftoffsAndMasks(int numContacts) {
     // A path that is already clear stays as it is when cleared again, so only the others are
     // looked at; clearing one leaves the rest of the table's marks as they were.
     for (uint32_t bits = marks_.dirtySlots & ~1u; bits != 0; bits &= bits - 1) {
-        HIDParserPath* path = paths_[static_cast<size_t>(std::countr_zero(bits))].get();
+        HIDParserPath* path = slots_[static_cast<size_t>(std::countr_zero(bits))];
         if (noContacts || path->currentContact().fingerTipSwitch == 0) {
             // A lift-off stays visible for exactly one frame and is wiped here, on the next.
             path->clear();
@@ -67,7 +70,7 @@ void HIDPathStateBasic::clearExistingPathLiftoffsAndMasksOneByOne(const HIDEvent
     if (!frame) return;
     const bool noContacts = getNumberOfContacts(frame) == 0;
     for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) {
-        HIDParserPath* path = paths_[slot].get();
+        HIDParserPath* path = slots_[static_cast<size_t>(slot)];
         if (noContacts) {
             path->clear();
         } else if (path->currentContact().fingerTipSwitch == 0) {
@@ -90,7 +93,7 @@ void HIDPathStateBasic::expandAndFilterPackedContacts(const HIDEvent& frame, int
         const HIDEvent& child = *children[static_cast<size_t>(i)];
         const int32_t index = static_cast<int32_t>(child.integerValueForField(kHIDEventFieldDigitizerIndex));
         if (index > kHighestContactIndex || index < kLowestContactIndex) continue;
-        HIDParserPath* path = paths_[static_cast<size_t>(index + 1)].get();
+        HIDParserPath* path = slots_[static_cast<size_t>(index + 1)];
         path->updateCurPrevContactsWith(child, currentTimestamp());
         if (path->isNewContact()) ++numNewContacts_;
         // Contacts read before the frame's first new contact get no strong damping and every one
@@ -110,7 +113,7 @@ int HIDPathStateBasic::getNumberOfContacts(const HIDEventRef& frame) const {
 HIDParserPath* HIDPathStateBasic::findParserPathforPathIDBySearch(int pathID) const {
     if (pathID == 0) return nullptr;
     for (int slot = kFirstPathID; slot <= kLastPathID; ++slot) {
-        HIDParserPath* path = paths_[static_cast<size_t>(slot)].get();
+        HIDParserPath* path = slots_[static_cast<size_t>(slot)];
         if (path->currentContact().path_id == pathID) return path;
     }
     return nullptr;

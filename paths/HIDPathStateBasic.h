@@ -3,6 +3,7 @@
 // indices 0..13), the unpacking of each contact frame into it, and the per-frame counts,
 // bottom-most path, diving-button membership, fastest-finger speeds and centroid.
 
+#include <array>
 #include <bit>
 #include <memory>
 #include <type_traits>
@@ -31,8 +32,8 @@ public:
     int getNumberOfContacts(const HIDEventRef& frame) const;
     // The path at a slot; nullptr outside the table.
     HIDParserPath* getParserPath(int slot) const {
-        if (slot < 0 || slot >= static_cast<int>(paths_.size())) return nullptr;
-        return paths_[static_cast<size_t>(slot)].get();
+        if (slot < 0 || slot >= kNumPaths) return nullptr;
+        return slots_[static_cast<size_t>(slot)];
     }
     // The first path of slots 1..14 whose current contact has this ID; nullptr for none (and for 0).
     HIDParserPath* getParserPathforPathID(int pathID) const {
@@ -43,7 +44,7 @@ public:
         // slot carries another's ID, no other slot has it at all. The table only ever reads
         // contacts into their own slots, so the search is for paths changed from outside.
         if (pathID >= 1 && pathID < kNumPaths) {
-            HIDParserPath* own = paths_[static_cast<size_t>(pathID)].get();
+            HIDParserPath* own = slots_[static_cast<size_t>(pathID)];
             if ((marks_.looseSlots & ((1u << pathID) - 1)) == 0 && own->currentContact().path_id == pathID) return own;
         }
         if (marks_.looseSlots == 0) return nullptr;
@@ -62,7 +63,7 @@ public:
         if (marks_.looseSlots == 0) {
             for (uint32_t bits = marks_.ownSlots; bits != 0; bits &= bits - 1) {
                 const int id = std::countr_zero(bits);
-                if (visitStops(visit, paths_[static_cast<size_t>(id)].get(), id)) return true;
+                if (visitStops(visit, slots_[static_cast<size_t>(id)], id)) return true;
             }
             return false;
         }
@@ -88,7 +89,7 @@ public:
         // A slot outside ownSlots carries its own ID only while it is loose.
         for (uint32_t bits = marks_.ownSlots | marks_.looseSlots; bits != 0; bits &= bits - 1) {
             const int slot = std::countr_zero(bits);
-            HIDParserPath* path = paths_[static_cast<size_t>(slot)].get();
+            HIDParserPath* path = slots_[static_cast<size_t>(slot)];
             if (path->currentContact().path_id == slot) visitStops(visit, path, slot);
         }
     }
@@ -96,7 +97,7 @@ public:
     template <typename Visit>
     void forEachPathInOwnSlotOneByOne(Visit&& visit) const {
         for (int slot = kFirstSlot; slot <= kLastSlot; ++slot) {
-            HIDParserPath* path = paths_[static_cast<size_t>(slot)].get();
+            HIDParserPath* path = slots_[static_cast<size_t>(slot)];
             if (path->currentContact().path_id == slot) visitStops(visit, path, slot);
         }
     }
@@ -145,6 +146,8 @@ private:
     }
 
     std::vector<std::shared_ptr<HIDParserPath>> paths_;
+    // The same paths, for the lookups of every frame.
+    std::array<HIDParserPath*, kNumPaths> slots_{};
     // Kept up to date by the paths themselves (see HIDParserPath::linkToTable).
     HIDPathTableMarks marks_;
     int numNewContacts_ = 0;
