@@ -21,9 +21,8 @@ ORVANE_EXPORT bool _isInternalBuild(void);
 
 namespace orvane {
 
-// _isInternalBuild's answer, kept here after the first call (-1 until then). Asked on every
-// frame, so it is one plain load; two threads that ask at once both get the one answer
-// _isInternalBuild keeps.
+// _isInternalBuild's answer, kept here after the first call (-1 until then); two threads that
+// ask at once both get the one answer _isInternalBuild keeps.
 inline std::atomic<int> internalBuildAnswer{-1};
 inline bool internalBuild() {
     int answer = internalBuildAnswer.load(std::memory_order_relaxed);
@@ -34,9 +33,18 @@ inline bool internalBuild() {
     return answer != 0;
 }
 
+// False once the build is known not to be an internal one: the diagnostics are then off for
+// good, and the checks of every frame are one test of this flag.
+inline std::atomic<bool> diagnosticsMayBeOn{true};
+
 // Per-frame diagnostics run only on an internal build with the verbose handle at debug level.
 inline bool verboseDebugEnabled() {
-    return internalBuild() && LoggingServiceFilterVerbose()->isEnabled(LogLevel::Debug);
+    if (!diagnosticsMayBeOn.load(std::memory_order_relaxed)) return false;
+    if (!internalBuild()) {
+        diagnosticsMayBeOn.store(false, std::memory_order_relaxed);
+        return false;
+    }
+    return LoggingServiceFilterVerbose()->isEnabled(LogLevel::Debug);
 }
 
 // Logs at debug level on the verbose handle when verboseDebugEnabled().
