@@ -41,7 +41,6 @@ constexpr float kSlowPairSymmetryBoost = 3.0f;
 
 // Average velocities below this are treated as standing still.
 constexpr float kStillFingerSpeed_mm_s = 1.0f;
-constexpr float kSpeedSimilarityStartMinimum = 10000.0f;
 
 // Break-out of the thumb zone: the thumb moves with the other fingers.
 // The fractional thresholds are compared in double against the single-precision values.
@@ -120,10 +119,13 @@ bool HIDPathStates::makeOrBreakTouchHappened(const HIDEventRef&) const {
         [](const HIDParserPath* path, int) { return path->isMakeStage() || path->isLiftOffStage(); });
 }
 
-void HIDPathStates::updateDivingBoardDisplacements() {
+void HIDPathStates::updateDivingBoardDisplacements() { updateDivingBoardDisplacements(nullptr); }
+
+void HIDPathStates::updateDivingBoardDisplacements(bool* makeOrBreak) {
     earliestNonDivingTimestamp_ = 0.0;
     const int bottom = bottomDivingPathIndex();
-    forEachPathByID([this, bottom](const HIDParserPath* path, int id) {
+    forEachPathByID([this, bottom, makeOrBreak](const HIDParserPath* path, int id) {
+        if (makeOrBreak && (path->isMakeStage() || path->isLiftOffStage())) *makeOrBreak = true;
         if (!path->isTouching() || !path->isFingerContact() || id == bottom) return;
         const double tMake = path->timestamps().t_makeTouch;
         if (earliestNonDivingTimestamp_ == 0.0 || tMake < earliestNonDivingTimestamp_) earliestNonDivingTimestamp_ = tMake;
@@ -131,20 +133,44 @@ void HIDPathStates::updateDivingBoardDisplacements() {
 }
 
 [[gnu::flatten]] void HIDPathStates::postFilteringTasks(const HIDEventRef& frame) {
+    // Whether a finger touched down or lifted is seen in the walk of the resting-thumb check:
+    // nothing between the two changes a contact.
+    bool makeOrBreak = false;
+    checkForRestingThumb(&makeOrBreak);
+    // One walk sets the thumb-zone flags, gathers the fingers for the speed symmetries and
+    // their speed range for the similarity: each reads nothing the others write.
+    SpeedSymmetryFingers gathered;
+    SpeedRange range;
+    forEachPathByID([&](HIDParserPath* path, int id) {
+        // The thumb-zone decision never changes in a frame where a finger touches down or lifts.
+        if (!makeOrBreak && !path->isNoTrackingStage()) setThumbZoneFlag(path, id);
+        gathered.add(path, id);
+        range.add(path);
+    });
+    gathered.finish();
+    const float similarity = range.similarity();
+    breakOutOfRestingThumb(&similarity);
+    setRestingFlag(frame);
+    calculateNewHandCenter(frame);
+}
+
+void HIDPathStates::setThumbZoneFlag(HIDParserPath* path, int id) {
+    const bool resting =
+        restingThumbExists_ && id == bottomDivingPathIndex() && !(engagedinGesture_ && numTouches() == 2);
+    path->setIsRestingInThumbZone(resting);
+    logVerbose("%s restingthumexists %d divingpathID %d pathID %d isRestingthumbinzone %d",
+               "-[HIDPathStates postFilteringTasks:]", restingThumbExists_, bottomDivingPathIndex(), id,
+               path->isRestingInThumbZone());
+}
+
+void HIDPathStates::postFilteringTasksOneByOne(const HIDEventRef& frame) {
     checkForRestingThumb();
-    // The thumb-zone decision never changes in a frame where a finger touches down or lifts.
     if (!makeOrBreakTouchHappened(frame)) {
-        forEachPathByID([this](HIDParserPath* path, int id) {
-            if (path->isNoTrackingStage()) return;
-            const bool resting = restingThumbExists_ && id == bottomDivingPathIndex() &&
-                                 !(engagedinGesture_ && numTouches() == 2);
-            path->setIsRestingInThumbZone(resting);
-            logVerbose("%s restingthumexists %d divingpathID %d pathID %d isRestingthumbinzone %d",
-                       "-[HIDPathStates postFilteringTasks:]", restingThumbExists_, bottomDivingPathIndex(), id,
-                       path->isRestingInThumbZone());
+        forEachPathByIDOneByOne([this](HIDParserPath* path, int id) {
+            if (!path->isNoTrackingStage()) setThumbZoneFlag(path, id);
         });
     }
-    updateSpeedSymmetriesOfAllPaths();
+    updateSpeedSymmetriesOfAllPathsOneByOne();
     breakOutOfRestingThumbBasedOnSymmetry();
     setRestingFlag(frame);
     calculateNewHandCenter(frame);
@@ -174,10 +200,12 @@ float HIDPathStates::getMaxThumbRestingHeight(const HIDParserPath* path) const {
     return static_cast<float>(kThumbRestZoneFraction * static_cast<double>(path->surfaceDimensions().y));
 }
 
-void HIDPathStates::checkForRestingThumb() {
+void HIDPathStates::checkForRestingThumb() { checkForRestingThumb(nullptr); }
+
+void HIDPathStates::checkForRestingThumb(bool* makeOrBreak) {
     restingThumbDidExist_ = restingThumbExists_;
     restingThumbExists_ = false;
-    updateDivingBoardDisplacements();
+    updateDivingBoardDisplacements(makeOrBreak);
 
     const int bottom = bottomDivingPathIndex();
     if (bottom < 1) return;
@@ -226,21 +254,23 @@ void HIDPathStates::checkForRestingThumb() {
 void HIDPathStates::updateSpeedSymmetriesOfAllPaths() {
     // The touching fingers are gathered once; each one's symmetry is then worked out against
     // the others of the same list, which is what asking every path in turn would gather.
-    // Only the entries written are read, so none is set beforehand.
-    std::array<HIDParserPath*, kMaxPaths> fingers;
-    std::array<HIDPoint, kMaxPaths> velocities;
-    std::array<float, kMaxPaths> speeds;
-    size_t numFingers = 0;
-    forEachPathByID([&](HIDParserPath* path, int id) {
-        if (path->currentContact().path_id == id && path->isFingerOrRestingContact() && path->isTouching()) {
-            fingers[numFingers] = path;
-            velocities[numFingers] = path->dampedVelocity();
-            speeds[numFingers] = path->dampedSpeed();
-            ++numFingers;
-        } else if (!path->isTouching()) {
-            path->clearPathSpeedSymmetry();
-        }
-    });
+    SpeedSymmetryFingers gathered;
+    forEachPathByID([&gathered](HIDParserPath* path, int id) { gathered.add(path, id); });
+    gathered.finish();
+}
+
+void HIDPathStates::SpeedSymmetryFingers::add(HIDParserPath* path, int id) {
+    if (path->currentContact().path_id == id && path->isFingerOrRestingContact() && path->isTouching()) {
+        fingers[numFingers] = path;
+        velocities[numFingers] = path->dampedVelocity();
+        speeds[numFingers] = path->dampedSpeed();
+        ++numFingers;
+    } else if (!path->isTouching()) {
+        path->clearPathSpeedSymmetry();
+    }
+}
+
+void HIDPathStates::SpeedSymmetryFingers::finish() {
 
     if (numFingers == 2 && !verboseDebugEnabled()) {
         // Two fingers: each one's symmetry is against the other alone, and the cosine between
@@ -370,19 +400,24 @@ float HIDPathStates::compute_2F_path_speed_symmetry(std::span<const float> speed
 }
 
 float HIDPathStates::computeSpeedSimilarity() const {
-    float minimum = kSpeedSimilarityStartMinimum;
-    float maximum = 0.0f;
-    forEachPathByID([&](const HIDParserPath* path, int) {
-        if (!path->isTouching() || !path->isFingerOrRestingContact()) return;
-        float speed = lengthOf(path->getAverageVelocity_mm_s());
-        if (speed < kStillFingerSpeed_mm_s) speed = 0.0f;
-        minimum = std::min(minimum, speed);
-        maximum = std::max(maximum, speed);
-    });
-    return maximum > 0.0f ? minimum / maximum : 1.0f;
+    SpeedRange range;
+    forEachPathByID([&range](const HIDParserPath* path, int) { range.add(path); });
+    return range.similarity();
 }
 
-void HIDPathStates::breakOutOfRestingThumbBasedOnSymmetry() {
+void HIDPathStates::SpeedRange::add(const HIDParserPath* path) {
+    if (!path->isTouching() || !path->isFingerOrRestingContact()) return;
+    float speed = lengthOf(path->getAverageVelocity_mm_s());
+    if (speed < kStillFingerSpeed_mm_s) speed = 0.0f;
+    minimum = std::min(minimum, speed);
+    maximum = std::max(maximum, speed);
+}
+
+float HIDPathStates::SpeedRange::similarity() const { return maximum > 0.0f ? minimum / maximum : 1.0f; }
+
+void HIDPathStates::breakOutOfRestingThumbBasedOnSymmetry() { breakOutOfRestingThumb(nullptr); }
+
+void HIDPathStates::breakOutOfRestingThumb(const float* knownSimilarity) {
     const bool restingHandScalesOrTurns = maxMotionDeltasResting_ == motionDeltasResting_.scale ||
                                           maxMotionDeltasResting_ == motionDeltasResting_.rotate;
     // The similarity depends on no thumb-zone flag, so the loop changes it nowhere: it is
@@ -392,7 +427,7 @@ void HIDPathStates::breakOutOfRestingThumbBasedOnSymmetry() {
     forEachPathByID([&](HIDParserPath* path, int) {
         if (path->isNoTrackingStage()) return;
         if (!similarityKnown) {
-            similarity = computeSpeedSimilarity();
+            similarity = knownSimilarity ? *knownSimilarity : computeSpeedSimilarity();
             similarityKnown = true;
         }
         speedSimilarity_ = similarity;

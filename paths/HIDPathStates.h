@@ -3,6 +3,7 @@
 // resting thumb, thumb-zone flags, speed symmetries, the resting mark written into the
 // contact events and the hand centre written into the frame event.
 
+#include <array>
 #include <cstddef>
 #include <span>
 #include <vector>
@@ -20,6 +21,8 @@ public:
     // A query with a side effect: a change is time-stamped and marked unhandled.
     bool buttonStateChanged();
     void postFilteringTasks(const HIDEventRef& frame);
+    // The same steps one after the other, each walking the table on its own.
+    void postFilteringTasksOneByOne(const HIDEventRef& frame);
     bool makeOrBreakTouchHappened(const HIDEventRef& frame) const;
     void setRestingFlag(const HIDEventRef& frame);
     void updateDivingBoardDisplacements();
@@ -64,6 +67,34 @@ public:
                                                  size_t numOthers);
 
 private:
+    // The touching fingers of the table gathered for their speed symmetries, in ID order.
+    struct SpeedSymmetryFingers {
+        // Only the entries written are read, so none is set beforehand.
+        std::array<HIDParserPath*, kNumPaths - 1> fingers;
+        std::array<HIDPoint, kNumPaths - 1> velocities;
+        std::array<float, kNumPaths - 1> speeds;
+        size_t numFingers = 0;
+        // Takes a path found for this ID: gathered when it is a touching finger of its own
+        // slot, its symmetry cleared when it does not touch.
+        void add(HIDParserPath* path, int id);
+        // Sets every gathered finger's symmetry against the others.
+        void finish();
+    };
+    // The slowest and fastest average speed of the touching fingers.
+    struct SpeedRange {
+        // The minimum starts far above any speed.
+        float minimum = 10000.0f;
+        float maximum = 0.0f;
+        void add(const HIDParserPath* path);
+        float similarity() const;
+    };
+    // The thumb-zone flag of a tracked path in a frame where no finger touched down or lifted.
+    void setThumbZoneFlag(HIDParserPath* path, int id);
+    // The steps of post-filtering, each able to take what the frame's walk already found.
+    void checkForRestingThumb(bool* makeOrBreak);
+    void updateDivingBoardDisplacements(bool* makeOrBreak);
+    void breakOutOfRestingThumb(const float* knownSimilarity);
+
 
     int buttonState_ = 0;
     int previousButtonState_ = 0;

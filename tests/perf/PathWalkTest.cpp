@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "paths/HIDPathStates.h"
+#include "tools/formats/FrameRecording.h"
 #include "PerfSessions.h"
 
 namespace orvane {
@@ -225,6 +226,63 @@ TEST(PathWalk, ClearingOnlyTheSlotsNotClearLeavesTheTableAsClearingEverySlotDoes
     }
     EXPECT_EQ(differences, 0);
     EXPECT_GT(cleared, 4000);
+}
+
+// Everything post-filtering leaves in a table, bit for bit.
+std::string tableStateOf(const HIDPathStates& t) {
+    std::string text;
+    for (int s = 0; s < HIDPathStateBasic::kNumPaths; ++s) text += stateOf(*t.getParserPath(s)) + "\n";
+    text += std::to_string(t.restingThumbExists()) + std::to_string(t.restingThumbDidExist()) + " " +
+            hex(t.speedSimilarity()) + hex(t.earliestNonDivingTimestamp()) + hex(t.divingButtonChangeTimestamp()) +
+            std::to_string(t.handledDivingButtonStateChange());
+    return text;
+}
+
+// Post-filtering in one walk leaves the table and the frame as the steps one after the other
+// do: on every frame of the random sessions, with the gesture state the whole pipeline fed
+// back at that point, and with that state mixed up at random.
+TEST(PathWalk, PostFilteringInOneWalkDoesWhatTheStepsOneAfterTheOtherDo) {
+    std::mt19937 random(31);
+    int frames = 0;
+    int differences = 0;
+    int restingFrames = 0;
+    for (const std::string& path : perf::randomSessions()) {
+        formats::FrameRecording recording;
+        std::string error;
+        ASSERT_TRUE(formats::readFrameRecordingFile(path, &recording, &error)) << error;
+        const float height = perf::surfaceSide(recording, "Height");
+        const float width = perf::surfaceSide(recording, "Width");
+        HIDParser parser([](const HIDEventRef&) {}, height, width);
+        HIDPathStates oneWalk(height, width);
+        HIDPathStates stepByStep(height, width);
+        for (const formats::InputRecord& record : recording.records) {
+            if (record.kind != formats::InputRecord::Kind::Event) continue;
+            const double time = static_cast<double>(record.event->timestamp());
+            HIDEventRef a = record.event->copy();
+            HIDEventRef b = record.event->copy();
+            const HIDPathStates& fed = *parser.pathStates();
+            const bool mixUp = std::uniform_int_distribution<int>(0, 3)(random) == 0;
+            const bool engaged = mixUp ? std::uniform_int_distribution<int>(0, 1)(random) == 1 : fed.engagedinGesture();
+            for (HIDPathStates* table : {&oneWalk, &stepByStep}) {
+                table->unpackContactFrame(table == &oneWalk ? a : b, time);
+                table->updateButtonState(table == &oneWalk ? a : b);
+                table->setEngagedinGesture(engaged);
+                table->setMotionDeltas(fed.motionDeltas());
+                table->setMotionDeltasResting(fed.motionDeltasResting());
+                table->setMaxMotionDeltas(fed.maxMotionDeltas());
+                table->setMaxMotionDeltasResting(fed.maxMotionDeltasResting());
+            }
+            oneWalk.postFilteringTasks(a);
+            stepByStep.postFilteringTasksOneByOne(b);
+            if (tableStateOf(oneWalk) != tableStateOf(stepByStep) || a->description() != b->description()) ++differences;
+            if (oneWalk.restingThumbExists()) ++restingFrames;
+            parser.handleContactFrame(time, record.event->copy());
+            ++frames;
+        }
+    }
+    EXPECT_EQ(differences, 0);
+    EXPECT_GT(frames, 5000);
+    EXPECT_GT(restingFrames, frames / 50);  // resting thumbs were among them
 }
 
 }  // namespace
