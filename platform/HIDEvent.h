@@ -304,15 +304,14 @@ inline std::shared_ptr<HIDEvent> HIDEventPool::makeInline(uint32_t type, uint64_
             --s.idle;
             if (IdleBlock* idle = s.idleBlocks) {
                 s.idleBlocks = idle->next;
-                --s.blocksIdle;
                 block = idle;
             }
         } else {
             ++s.created;
         }
     }
+    // The link of a taken event is left as it was: it is read only while the event is idle.
     if (event) [[likely]] {
-        event->poolNext_ = nullptr;
         event->type_ = type;
         event->options_ = options;
         event->timestamp_ = timestamp;
@@ -324,7 +323,7 @@ inline std::shared_ptr<HIDEvent> HIDEventPool::makeInline(uint32_t type, uint64_
 }
 
 // The creation calls write the slots of the new event directly: it comes from the pool with
-// no field set.
+// no field set, so its fields are exactly the ones written here.
 inline HIDEventRef HIDEvent::pointerEvent(uint64_t timestamp, double x, double y, double z, uint32_t buttonMask,
                                           uint32_t options) {
     HIDEventRef e = HIDEventPool::makeInline(kHIDEventTypePointer, timestamp, options);
@@ -334,7 +333,7 @@ inline HIDEventRef HIDEvent::pointerEvent(uint64_t timestamp, double x, double y
     e->slots_[first + 1] = std::bit_cast<uint64_t>(y);
     e->slots_[first + 2] = std::bit_cast<uint64_t>(z);
     e->slots_[first + 3] = static_cast<uint64_t>(static_cast<int64_t>(buttonMask));
-    e->known_ |= uint64_t{0xf} << first;
+    e->known_ = uint64_t{0xf} << first;
     return e;
 }
 
@@ -347,7 +346,7 @@ inline HIDEventRef HIDEvent::threeAxisEvent(uint64_t timestamp, double x, double
     e->slots_[first] = std::bit_cast<uint64_t>(x);
     e->slots_[first + 1] = std::bit_cast<uint64_t>(y);
     e->slots_[first + 2] = std::bit_cast<uint64_t>(z);
-    e->known_ |= uint64_t{0x7} << first;
+    e->known_ = uint64_t{0x7} << first;
     return e;
 }
 

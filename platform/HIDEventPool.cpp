@@ -23,7 +23,6 @@ void* HIDEventPool::allocateBlock(size_t size) {
         Guard guard(s.lock);
         if (IdleBlock* block = s.idleBlocks) {
             s.idleBlocks = block->next;
-            --s.blocksIdle;
             return block;
         }
         ++s.blocksCreated;
@@ -41,7 +40,6 @@ void HIDEventPool::deallocateBlock(void* block, size_t size) noexcept {
     auto* idle = static_cast<IdleBlock*>(block);
     idle->next = s.idleBlocks;
     s.idleBlocks = idle;
-    ++s.blocksIdle;
 }
 
 void HIDEventPool::recycle(HIDEvent* event) noexcept {
@@ -75,7 +73,9 @@ std::shared_ptr<HIDEvent> HIDEventPool::make(uint32_t type, uint64_t timestamp, 
 HIDEventPool::Statistics HIDEventPool::statistics() {
     State& s = state_;
     Guard guard(s.lock);
-    return Statistics{s.created, s.idle, s.blocksCreated, s.blocksIdle};
+    size_t blocksIdle = 0;
+    for (const IdleBlock* block = s.idleBlocks; block; block = block->next) ++blocksIdle;
+    return Statistics{s.created, s.idle, s.blocksCreated, blocksIdle};
 }
 
 }  // namespace orvane

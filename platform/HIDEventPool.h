@@ -91,7 +91,8 @@ private:
         size_t created = 0;
         size_t idle = 0;
         size_t blocksCreated = 0;
-        size_t blocksIdle = 0;
+        // The idle blocks are counted by statistics(), which walks their list: nothing on the
+        // frame path keeps a count of them.
     };
     // Constant-initialised and never destroyed (there is nothing to destroy): events may be
     // released by other objects' destructors at exit.
