@@ -82,21 +82,6 @@ void HIDEvent::resetForPool() noexcept {
     }
 }
 
-// The creation calls write the slots of the new event directly: it comes from the pool with
-// no field set.
-HIDEventRef HIDEvent::pointerEvent(uint64_t timestamp, double x, double y, double z, uint32_t buttonMask,
-                                   uint32_t options) {
-    HIDEventRef e = HIDEventPool::make(kHIDEventTypePointer, timestamp, options);
-    constexpr int first = hidFieldSlot(kHIDEventFieldPointerX);
-    static_assert(hidFieldSlot(kHIDEventFieldPointerButtonMask) == first + 3 && !hidFieldSlotIsDouble(first + 3));
-    e->slots_[first] = std::bit_cast<uint64_t>(x);
-    e->slots_[first + 1] = std::bit_cast<uint64_t>(y);
-    e->slots_[first + 2] = std::bit_cast<uint64_t>(z);
-    e->slots_[first + 3] = static_cast<uint64_t>(static_cast<int64_t>(buttonMask));
-    e->known_ |= uint64_t{0xf} << first;
-    return e;
-}
-
 HIDEventRef HIDEvent::pointerEventLiteral(uint64_t timestamp, double x, double y, double z, uint32_t buttonMask,
                                           uint32_t options) {
     HIDEventRef e = create(kHIDEventTypePointer, timestamp, options);
@@ -107,19 +92,6 @@ HIDEventRef HIDEvent::pointerEventLiteral(uint64_t timestamp, double x, double y
     return e;
 }
 
-template <uint32_t Type>
-HIDEventRef HIDEvent::threeAxisEvent(uint64_t timestamp, double x, double y, double z, uint32_t options) {
-    HIDEventRef e = HIDEventPool::make(Type, timestamp, options);
-    constexpr int first = hidFieldSlot(hidFieldSelector(Type, 0));
-    static_assert(hidFieldSlot(hidFieldSelector(Type, 2)) == first + 2 && hidFieldSlotIsDouble(first) &&
-                  hidFieldSlotIsDouble(first + 2));
-    e->slots_[first] = std::bit_cast<uint64_t>(x);
-    e->slots_[first + 1] = std::bit_cast<uint64_t>(y);
-    e->slots_[first + 2] = std::bit_cast<uint64_t>(z);
-    e->known_ |= uint64_t{0x7} << first;
-    return e;
-}
-
 HIDEventRef HIDEvent::threeAxisEventLiteral(uint32_t type, uint64_t timestamp, double x, double y, double z,
                                             uint32_t options) {
     HIDEventRef e = create(type, timestamp, options);
@@ -127,10 +99,6 @@ HIDEventRef HIDEvent::threeAxisEventLiteral(uint32_t type, uint64_t timestamp, d
     e->setDoubleValue(y, hidFieldSelector(type, 1));
     e->setDoubleValue(z, hidFieldSelector(type, 2));
     return e;
-}
-
-HIDEventRef HIDEvent::scrollEvent(uint64_t timestamp, double x, double y, double z, uint32_t options) {
-    return threeAxisEvent<kHIDEventTypeScroll>(timestamp, x, y, z, options);
 }
 
 HIDEventRef HIDEvent::createScaleEvent(uint64_t timestamp, double x, double y, double z, uint32_t options) {

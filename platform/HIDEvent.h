@@ -12,6 +12,8 @@
 #include <string>
 #include <vector>
 
+#include "HIDEventPool.h"
+
 namespace orvane {
 
 class HIDEvent;
@@ -133,8 +135,6 @@ constexpr bool hidFieldSlotIsDouble(int slot) { return (kHIDDoubleFieldSlots >> 
 // The selector of a slot.
 uint32_t hidFieldSlotSelector(int slot);
 
-class HIDEventPool;
-
 class HIDEvent {
 public:
     struct Field {
@@ -149,7 +149,8 @@ public:
     HIDEvent(const HIDEvent&) = delete;
     HIDEvent& operator=(const HIDEvent&) = delete;
 
-    // Creation calls. Each sets exactly the fields named and no others.
+    // Creation calls. Each sets exactly the fields named and no others. The pointer and scroll
+    // calls, made on every frame, are written out where they are called (below).
     static HIDEventRef create(uint32_t type, uint64_t timestamp, uint32_t options = 0);
     static HIDEventRef pointerEvent(uint64_t timestamp, double x, double y, double z, uint32_t buttonMask,
                                     uint32_t options);
@@ -289,5 +290,68 @@ private:
     mutable std::vector<Field> list_;
     mutable std::atomic_flag listLock_ = ATOMIC_FLAG_INIT;
 };
+
+// Written out here so that the filter makes its events without calls into this library: the
+// event and the block that counts its references come off the idle lists under one lock.
+inline std::shared_ptr<HIDEvent> HIDEventPool::makeInline(uint32_t type, uint64_t timestamp, uint32_t options) {
+    State& s = state_;
+    HIDEvent* event;
+    void* block = nullptr;
+    {
+        Guard guard(s.lock);
+        if ((event = s.idleEvents) != nullptr) {
+            s.idleEvents = event->poolNext_;
+            --s.idle;
+            if (IdleBlock* idle = s.idleBlocks) {
+                s.idleBlocks = idle->next;
+                block = idle;
+            }
+        } else {
+            ++s.created;
+        }
+    }
+    // The link of a taken event is left as it was: it is read only while the event is idle.
+    if (event) [[likely]] {
+        event->type_ = type;
+        event->options_ = options;
+        event->timestamp_ = timestamp;
+    } else {
+        event = newEvent(type, timestamp, options);
+    }
+    // Without a block taken here the allocator gets one from allocateBlock.
+    return std::shared_ptr<HIDEvent>(event, HIDEventRecycler{}, HIDEventBlockAllocator<HIDEvent>(block));
+}
+
+// The creation calls write the slots of the new event directly: it comes from the pool with
+// no field set, so its fields are exactly the ones written here.
+inline HIDEventRef HIDEvent::pointerEvent(uint64_t timestamp, double x, double y, double z, uint32_t buttonMask,
+                                          uint32_t options) {
+    HIDEventRef e = HIDEventPool::makeInline(kHIDEventTypePointer, timestamp, options);
+    constexpr int first = hidFieldSlot(kHIDEventFieldPointerX);
+    static_assert(hidFieldSlot(kHIDEventFieldPointerButtonMask) == first + 3 && !hidFieldSlotIsDouble(first + 3));
+    e->slots_[first] = std::bit_cast<uint64_t>(x);
+    e->slots_[first + 1] = std::bit_cast<uint64_t>(y);
+    e->slots_[first + 2] = std::bit_cast<uint64_t>(z);
+    e->slots_[first + 3] = static_cast<uint64_t>(static_cast<int64_t>(buttonMask));
+    e->known_ = uint64_t{0xf} << first;
+    return e;
+}
+
+template <uint32_t Type>
+inline HIDEventRef HIDEvent::threeAxisEvent(uint64_t timestamp, double x, double y, double z, uint32_t options) {
+    HIDEventRef e = HIDEventPool::makeInline(Type, timestamp, options);
+    constexpr int first = hidFieldSlot(hidFieldSelector(Type, 0));
+    static_assert(hidFieldSlot(hidFieldSelector(Type, 2)) == first + 2 && hidFieldSlotIsDouble(first) &&
+                  hidFieldSlotIsDouble(first + 2));
+    e->slots_[first] = std::bit_cast<uint64_t>(x);
+    e->slots_[first + 1] = std::bit_cast<uint64_t>(y);
+    e->slots_[first + 2] = std::bit_cast<uint64_t>(z);
+    e->known_ = uint64_t{0x7} << first;
+    return e;
+}
+
+inline HIDEventRef HIDEvent::scrollEvent(uint64_t timestamp, double x, double y, double z, uint32_t options) {
+    return threeAxisEvent<kHIDEventTypeScroll>(timestamp, x, y, z, options);
+}
 
 }  // namespace orvane

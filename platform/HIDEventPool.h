@@ -10,9 +10,11 @@
 // instructions only. The pool lives for the whole process (it is never destroyed, so events
 // released during exit are still taken back).
 
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <memory>
+#include <type_traits>
 
 namespace orvane {
 
@@ -22,6 +24,9 @@ class HIDEventPool {
 public:
     // A reset event of this type, timestamp and options, from the pool or new.
     static std::shared_ptr<HIDEvent> make(uint32_t type, uint64_t timestamp, uint32_t options);
+    // The same, written out where it is called (defined in HIDEvent.h): the creation calls of
+    // the frame path use it, so that their events are made without a call into this library.
+    static inline std::shared_ptr<HIDEvent> makeInline(uint32_t type, uint64_t timestamp, uint32_t options);
 
     struct Statistics {
         size_t created = 0;      // event objects ever made
@@ -51,6 +56,53 @@ public:
 private:
     // A new event, for when none is idle.
     static HIDEvent* newEvent(uint32_t type, uint64_t timestamp, uint32_t options);
+
+    // A block on the idle list.
+    struct IdleBlock {
+        IdleBlock* next;
+    };
+    static_assert(kBlockSize >= sizeof(IdleBlock));
+
+    class SpinLock {
+    public:
+        void lock() noexcept {
+            if (flag_.test_and_set(std::memory_order_acquire)) waitAndLock(flag_);
+        }
+        void unlock() noexcept { flag_.clear(std::memory_order_release); }
+
+    private:
+        // Held by another thread: yields until it is free and takes it. Kept apart from lock()
+        // so that the uncontended path needs no registers saved.
+        static void waitAndLock(std::atomic_flag& flag) noexcept;
+
+        std::atomic_flag flag_ = ATOMIC_FLAG_INIT;
+    };
+
+    struct Guard {
+        explicit Guard(SpinLock& l) : lock(l) { lock.lock(); }
+        ~Guard() { lock.unlock(); }
+        SpinLock& lock;
+    };
+
+    struct State {
+        SpinLock lock;
+        HIDEvent* idleEvents = nullptr;
+        IdleBlock* idleBlocks = nullptr;
+        size_t created = 0;
+        size_t idle = 0;
+        size_t blocksCreated = 0;
+        // The idle blocks are counted by statistics(), which walks their list: nothing on the
+        // frame path keeps a count of them.
+    };
+    // Constant-initialised and never destroyed (there is nothing to destroy): events may be
+    // released by other objects' destructors at exit.
+    static State state_;
+    static_assert(std::is_trivially_destructible_v<State>);
+};
+
+// What a pooled event's last strong reference does: hands the event back to the pool.
+struct HIDEventRecycler {
+    void operator()(HIDEvent* event) const noexcept { HIDEventPool::recycle(event); }
 };
 
 // The allocator of the reference-count blocks of pooled events. It may be given a block

@@ -154,6 +154,31 @@ TEST(HIDEventPool, MakingAWarmEventTakesOneIdleEventAndOneIdleBlock) {
     EXPECT_EQ(HIDEventPool::statistics().blocksIdle, before.blocksIdle);
 }
 
+TEST(HIDEventPool, WrittenOutAndLibraryFormsShareOnePool) {
+    // An event made where it is called goes back to the pool the library's make draws from,
+    // and the other way round.
+    HIDEventRef inlined = HIDEventPool::makeInline(kHIDEventTypeScroll, 3, 5);
+    const HIDEvent* address = inlined.get();
+    EXPECT_EQ(inlined->type(), static_cast<uint32_t>(kHIDEventTypeScroll));
+    EXPECT_EQ(inlined->timestamp(), 3u);
+    EXPECT_EQ(inlined->options(), 5u);
+    inlined->setIntegerValue(4, kHIDEventFieldDigitizerIndex);
+    inlined.reset();
+    HIDEventRef made = HIDEventPool::make(kHIDEventTypePointer, 4, 0);
+    EXPECT_EQ(made.get(), address);
+    EXPECT_FALSE(made->hasField(kHIDEventFieldDigitizerIndex));
+    EXPECT_EQ(made->type(), static_cast<uint32_t>(kHIDEventTypePointer));
+    made.reset();
+    const HIDEventPool::Statistics before = HIDEventPool::statistics();
+    HIDEventRef again = HIDEvent::scrollEvent(6, 1.0, 2.0, 0.0, 0);
+    EXPECT_EQ(again.get(), address);
+    EXPECT_EQ(HIDEventPool::statistics().created, before.created);
+    EXPECT_EQ(HIDEventPool::statistics().blocksCreated, before.blocksCreated);
+    again.reset();
+    EXPECT_EQ(HIDEventPool::statistics().idle, before.idle);
+    EXPECT_EQ(HIDEventPool::statistics().blocksIdle, before.blocksIdle);
+}
+
 TEST(HIDEventPool, AllocatorGivenABlockUsesItOnceThenAsksThePool) {
     void* block = HIDEventPool::allocateBlock(HIDEventPool::kBlockSize);
     HIDEventBlockAllocator<uint64_t> allocator(block);
