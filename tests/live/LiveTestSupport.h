@@ -18,6 +18,7 @@
 #include "platform/HIDEventDispatcher.h"
 #include "platform/HIDEventService.h"
 #include "platform/Logging.h"
+#include "tests/support/ScratchFolder.h"
 #include "tools/evemu/EvdevCodes.h"
 #include "tools/evemu/EvemuConversion.h"
 #include "tools/evemu/EvemuParser.h"
@@ -267,22 +268,6 @@ public:
     std::shared_ptr<CaptureLogSink> capture = std::make_shared<CaptureLogSink>();
 };
 
-// A folder removed with everything in it when the test ends.
-class ScratchFolder {
-public:
-    ScratchFolder() {
-        char pattern[] = "/tmp/orvane-live-test-XXXXXX";
-        const char* made = ::mkdtemp(pattern);
-        path_ = made ? made : "";
-    }
-    ~ScratchFolder() {
-        if (!path_.empty()) std::system(("rm -rf '" + path_ + "'").c_str());
-    }
-    const std::string& path() const { return path_; }
-    std::string file(const std::string& name) const { return path_ + "/" + name; }
-
-private:
-    std::string path_;
-};
+using testsupport::ScratchFolder;
 
 }  // namespace orvane::live::test
