@@ -37,17 +37,23 @@ public:
     }
     // The first path of slots 1..14 whose current contact has this ID; nullptr for none (and for 0).
     HIDParserPath* getParserPathforPathID(int pathID) const {
+        // While no contact carries another slot's ID, the path is the ID's own slot's when its
+        // contact carries the ID (a cleared path carries 0, which no slot's bit stands for).
+        if (marks_.looseSlots == 0) {
+            return static_cast<unsigned>(pathID) < static_cast<unsigned>(kNumPaths) && (marks_.ownSlots >> pathID & 1u)
+                       ? slots_[static_cast<size_t>(pathID)]
+                       : nullptr;
+        }
         // A cleared path has ID 0; it is never found.
         if (pathID == 0) return nullptr;
         // While the slots before this ID's own slot carry their own IDs or none, none of them
-        // has this one, and the first slot that does is the ID's own, when it does; while no
-        // slot carries another's ID, no other slot has it at all. The table only ever reads
-        // contacts into their own slots, so the search is for paths changed from outside.
+        // has this one, and the first slot that does is the ID's own, when it does. The table
+        // only ever reads contacts into their own slots, so the search is for paths changed
+        // from outside.
         if (pathID >= 1 && pathID < kNumPaths) {
             HIDParserPath* own = slots_[static_cast<size_t>(pathID)];
             if ((marks_.looseSlots & ((1u << pathID) - 1)) == 0 && own->currentContact().path_id == pathID) return own;
         }
-        if (marks_.looseSlots == 0) return nullptr;
         return findParserPathforPathIDBySearch(pathID);
     }
     // The same answer found by looking at every slot in turn.
