@@ -58,7 +58,7 @@ inline void HIDParserPath::raisePeakDisplacement() {
     if (distance > peakDisplacement_) peakDisplacement_ = distance;
 }
 
-void HIDParserPath::updateCurPrevContactsWith(const HIDEvent& contact, double time) {
+void HIDParserPath::readContact(const HIDEvent& contact, double time) {
     link_.markDirty();
     previousContact_ = currentContact_;
     currentContact_.device_timestamp = time;
@@ -89,44 +89,17 @@ void HIDParserPath::updateCurPrevContactsWith(const HIDEvent& contact, double ti
         longTermPosition_ = currentContact_.position;
         peakDisplacement_ = 0.0f;
     }
+}
 
-    // The table is marked above for the whole reading.
+void HIDParserPath::updateCurPrevContactsWith(const HIDEvent& contact, double time) {
+    readContact(contact, time);
+    // The table is marked by the reading for the whole step.
     raisePeakDisplacement();
     updatePathStageTimestamps(time);
 }
 
 void HIDParserPath::updateCurPrevContactsWithLiteral(const HIDEvent& contact, double time) {
-    link_.markDirty();
-    previousContact_ = currentContact_;
-    currentContact_.device_timestamp = time;
-
-    currentContact_.fingerConfidence =
-        contact.integerValueForField(kHIDEventFieldDigitizerType) != kPalmTransducerType ? 1 : 0;
-    currentContact_.fingerTipSwitch = static_cast<int32_t>(contact.integerValueForField(kHIDEventFieldDigitizerTouch));
-    const int32_t index = static_cast<int32_t>(contact.integerValueForField(kHIDEventFieldDigitizerIndex));
-    // The finger ID is one more than the path ID, on purpose.
-    currentContact_.path_id = index + 1;
-    currentContact_.finger_id = index + 2;
-    link_.noteID(currentContact_.path_id);
-
-    const float x = static_cast<float>(contact.doubleValueForField(kHIDEventFieldDigitizerX));
-    const float y = static_cast<float>(contact.doubleValueForField(kHIDEventFieldDigitizerY));
-    currentContact_.position.x = x * surfaceDimensions_.x;
-    // Flipped, so that a larger y lies nearer the diving-button edge.
-    currentContact_.position.y = (1 - y) * surfaceDimensions_.y;
-
-    // Without a previous position the velocity keeps the value it already had.
-    if (previousContact_.position.x != 0 && previousContact_.position.y != 0) {
-        currentContact_.velocity.x = currentContact_.position.x - previousContact_.position.x;
-        currentContact_.velocity.y = currentContact_.position.y - previousContact_.position.y;
-    }
-
-    if (previousContact_.fingerTipSwitch == 0) {
-        initialPosition_ = currentContact_.position;
-        longTermPosition_ = currentContact_.position;
-        peakDisplacement_ = 0.0f;
-    }
-
+    readContact(contact, time);
     setPeakDisplacement();
     updatePathStageTimestamps(time);
 }

@@ -250,6 +250,9 @@ private:
 
     // The steps of setPeakDisplacement and updateDampedVelocity without marking the table,
     // for callers that have marked it already.
+    // The contact's fields, stage and velocity read into the path (the table marked), before
+    // the peak displacement and the stage times.
+    void readContact(const HIDEvent& contact, double time);
     void raisePeakDisplacement();
     void dampVelocity(bool strongDamping);
     // Works out the damping weight for a new frame interval.
