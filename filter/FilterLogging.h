@@ -53,4 +53,22 @@ inline void logVerbose(const char* format, const Args&... args) {
     if (verboseDebugEnabled()) LoggingServiceFilterVerbose()->log(LogLevel::Debug, format, args...);
 }
 
+// A stage's copy of diagnosticsMayBeOn, taken when the stage starts on a frame. The flag only
+// ever goes from true to false, so a copy that says false stays right for good and a copy that
+// says true only sends the test on to the flag. The copy is a plain value: testing it lets the
+// compiler keep the frame's other values in registers, where every load of the flag (an atomic)
+// makes it load them again.
+class FrameDiagnostics {
+public:
+    void takeCopy() { mayBeOn_ = diagnosticsMayBeOn.load(std::memory_order_relaxed); }
+    bool verboseDebugEnabled() const { return mayBeOn_ && orvane::verboseDebugEnabled(); }
+    template <typename... Args>
+    void logVerbose(const char* format, const Args&... args) const {
+        if (mayBeOn_) orvane::logVerbose(format, args...);
+    }
+
+private:
+    bool mayBeOn_ = true;
+};
+
 }  // namespace orvane

@@ -210,12 +210,13 @@ void HIDHandMotion::extractHandMotion(const HIDPathStates& pathTable, HIDParserP
                 pixelDeltas_.rotate = rotationFromVectorProduct(u, di, dO);
 
                 // One test of the log level for both lines when it is off.
-                if (verboseDebugEnabled()) {
-                    logVerbose("%s GESTURE : separation %f - previous_sep %f", kSig, s.magnitude,
-                               previousSeparation);
-                    logVerbose("%s GESTURE : normalized separation (%f,%f)  delta_innermost (%f,%f) "
-                               "delta_outermost (%f,%f)",
-                               kSig, u.x, u.y, di.x, di.y, dO.x, dO.y);
+                if (diagnostics_.verboseDebugEnabled()) {
+                    diagnostics_.logVerbose("%s GESTURE : separation %f - previous_sep %f", kSig, s.magnitude,
+                                            previousSeparation);
+                    diagnostics_.logVerbose(
+                        "%s GESTURE : normalized separation (%f,%f)  delta_innermost (%f,%f) "
+                        "delta_outermost (%f,%f)",
+                        kSig, u.x, u.y, di.x, di.y, dO.x, dO.y);
                 }
             }
         }
@@ -268,6 +269,7 @@ void HIDHandMotion::extractHandMotionWithResting(const HIDPathStates&, HIDParser
 // Flattened: the steps below are inlined into this one per-frame entry.
 [[gnu::flatten]] void HIDHandMotion::processHandMotion(HIDPathStates& pathTable, int32_t nTouching,
                                                        int32_t lastnTouching, uint32_t /*touchingMask*/) {
+    diagnostics_.takeCopy();
     updateFingerPathMappings(pathTable);
 
     if (pathTable.restingThumbExists() != pathTable.restingThumbDidExist() ||
@@ -347,7 +349,7 @@ void HIDHandMotion::updateFastestFingerSpeed(const HIDPathStates& pathTable) {
     averageMaxFingerSpeed_ = a * maxFingerSpeed_ + (1.0f - a) * currentMax;
 }
 
-void HIDHandMotion::clipMotionToDominantAxes(double frameInterval) {
+HIDHandMotion::DominantAxes HIDHandMotion::smoothVelocity(double frameInterval) {
     // With a 0.03 ms time constant the weight is 1 for any ordinary frame interval, so the
     // smoothing passes the new value straight through; kept that way on purpose.
     const double interval_ms = ticksToMilliseconds(frameInterval);
@@ -372,12 +374,74 @@ void HIDHandMotion::clipMotionToDominantAxes(double frameInterval) {
     float rotationWeight = 1.0f;
     computeTrackpadDominanceWeights(scaleWeight, rotationWeight);
 
-    const float s = scaleWeight * std::fabs(smoothedVelocity_.scale);
-    const float r = rotationWeight * std::fabs(smoothedVelocity_.rotate);
-    const float m = s > r ? s : r;
-    const float t = smoothedTranslationSpeed_;
+    DominantAxes axes;
+    axes.scale = scaleWeight * std::fabs(smoothedVelocity_.scale);
+    axes.rotation = rotationWeight * std::fabs(smoothedVelocity_.rotate);
+    axes.scaleOrRotation = axes.scale > axes.rotation ? axes.scale : axes.rotation;
+    axes.translation = smoothedTranslationSpeed_;
+    return axes;
+}
+
+void HIDHandMotion::clipMotionToDominantAxes(double frameInterval) {
+    const DominantAxes a = smoothVelocity(frameInterval);
+    const float s = a.scale;
+    const float r = a.rotation;
+    const float m = a.scaleOrRotation;
+    const float t = a.translation;
+
+    if (t > m) {
+        // Translation dominates.
+        if (t > 0.0f) nondominantAxesRatio_ = m / t;
+        clippedAxes_ = ClippedAxes::Translation;
+    } else {
+        // Scale or rotation dominates; ties go this way.
+        if (m > 0.0f) nondominantAxesRatio_ = t / m;
+        pixelDeltas_.x = 0.0f;
+        pixelDeltas_.y = 0.0f;
+        pixelDeltasWithResting_.x = 0.0f;
+        pixelDeltasWithResting_.y = 0.0f;
+        if (s > r) {
+            clippedAxes_ = ClippedAxes::Scale;
+            pixelDeltas_.rotate = 0.0f;
+            pixelDeltasWithResting_.rotate = 0.0f;
+        } else if (r > s) {
+            clippedAxes_ = ClippedAxes::Rotation;
+            pixelDeltas_.scale = 0.0f;
+            pixelDeltasWithResting_.scale = 0.0f;
+        } else {
+            clippedAxes_ = ClippedAxes::ScaleAndRotation;
+        }
+    }
+}
+
+HIDMotion HIDHandMotion::smoothedClippedVelocity() const {
+    if (clippedAxes_ == ClippedAxes::Kept) return smoothedClippedVelocity_;
+    HIDMotion v = smoothedVelocity_;
+    if (clippedAxes_ == ClippedAxes::Translation) {
+        v.scale = 0.0f;
+        v.rotate = 0.0f;
+    } else {
+        v.x = 0.0f;
+        v.y = 0.0f;
+        if (clippedAxes_ == ClippedAxes::Scale) v.rotate = 0.0f;
+        if (clippedAxes_ == ClippedAxes::Rotation) v.scale = 0.0f;
+    }
+    v.x = applyDeadZone(v.x);
+    v.y = applyDeadZone(v.y);
+    v.scale = applyDeadZone(v.scale);
+    v.rotate = applyDeadZone(v.rotate);
+    return v;
+}
+
+void HIDHandMotion::clipMotionToDominantAxesLiteral(double frameInterval) {
+    const DominantAxes a = smoothVelocity(frameInterval);
+    const float s = a.scale;
+    const float r = a.rotation;
+    const float m = a.scaleOrRotation;
+    const float t = a.translation;
 
     smoothedClippedVelocity_ = smoothedVelocity_;
+    clippedAxes_ = ClippedAxes::Kept;
 
     if (t > m) {
         // Translation dominates.
@@ -450,23 +514,25 @@ void HIDHandMotion::accumulateHandMotion() {
     accumulatedDeltasWithResting_.scale += std::fabs(pixelDeltasWithResting_.scale);
     accumulatedDeltasWithResting_.rotate += std::fabs(pixelDeltasWithResting_.rotate);
 
-    logVerbose("%s AccumMotion %f x %f y %f scale %f rotate speedSimilarity %f",
-               "-[HIDHandMotion accumulateHandMotion]", accumulatedDeltas_.x, accumulatedDeltas_.y,
-               accumulatedDeltas_.scale, accumulatedDeltas_.rotate, speedSimilarity_);
+    diagnostics_.logVerbose("%s AccumMotion %f x %f y %f scale %f rotate speedSimilarity %f",
+                            "-[HIDHandMotion accumulateHandMotion]", accumulatedDeltas_.x, accumulatedDeltas_.y,
+                            accumulatedDeltas_.scale, accumulatedDeltas_.rotate, speedSimilarity_);
 }
 
 void HIDHandMotion::clearAccumulateHandMotion() {
     clear2DPlaneMotion(accumulatedDeltas_);
     clear2DPlaneMotion(accumulatedDeltasWithResting_);
-    logVerbose("%s AccumMotion %f x %f y %f scale %f rotate", "-[HIDHandMotion clearAccumulateHandMotion]",
-               accumulatedDeltas_.x, accumulatedDeltas_.y, accumulatedDeltas_.scale, accumulatedDeltas_.rotate);
+    diagnostics_.logVerbose("%s AccumMotion %f x %f y %f scale %f rotate", "-[HIDHandMotion clearAccumulateHandMotion]",
+                            accumulatedDeltas_.x, accumulatedDeltas_.y, accumulatedDeltas_.scale,
+                            accumulatedDeltas_.rotate);
 }
 
 void HIDHandMotion::resetAccumulateHandMotion() {
     // The WithResting sum keeps running, on purpose.
     clear2DPlaneMotion(accumulatedDeltas_);
-    logVerbose("%s AccumMotion %f x %f y %f scale %f rotate", "-[HIDHandMotion resetAccumulateHandMotion]",
-               accumulatedDeltas_.x, accumulatedDeltas_.y, accumulatedDeltas_.scale, accumulatedDeltas_.rotate);
+    diagnostics_.logVerbose("%s AccumMotion %f x %f y %f scale %f rotate", "-[HIDHandMotion resetAccumulateHandMotion]",
+                            accumulatedDeltas_.x, accumulatedDeltas_.y, accumulatedDeltas_.scale,
+                            accumulatedDeltas_.rotate);
 }
 
 void HIDHandMotion::clearHandMotion(bool clearLocation) {
@@ -481,6 +547,7 @@ void HIDHandMotion::clearHandMotion(bool clearLocation) {
     clear2DPlaneMotion(velocity_);
     clear2DPlaneMotion(smoothedVelocity_);
     clear2DPlaneMotion(smoothedClippedVelocity_);
+    clippedAxes_ = ClippedAxes::Kept;
     clear2DPlaneMotion(accumulatedDeltas_);
     clear2DPlaneMotion(accumulatedDeltasWithResting_);
     smoothedTranslationSpeed_ = 0.0f;
@@ -491,14 +558,15 @@ void HIDHandMotion::clearHandMotion(bool clearLocation) {
 void HIDHandMotion::printExtractedMotion(int numFingers) const {
     static const char* kSig = "-[HIDHandMotion printExtractedMotion:]";
     // One test of the log level for both lines when it is off.
-    if (!verboseDebugEnabled()) return;
-    logVerbose("%s Motion %dM, %d<-->%d\n", kSig, numFingers, innermostTouchingFingerID(),
-               outermostTouchingFingerID());
-    logVerbose("%s Motion \t%4.2fdx %4.2fdy %4.2fds %4.2fdr | %5.3f/%5.3fvx %5.3f/%5.3fvy %5.3f/%5.3fvs "
-               "%5.3f/%5.3fvr\n",
-               kSig, pixelDeltas_.x, pixelDeltas_.y, pixelDeltas_.scale, pixelDeltas_.rotate,
-               smoothedClippedVelocity_.x, velocity_.x, smoothedClippedVelocity_.y, velocity_.y,
-               smoothedClippedVelocity_.scale, velocity_.scale, smoothedClippedVelocity_.rotate, velocity_.rotate);
+    if (!diagnostics_.verboseDebugEnabled()) return;
+    const HIDMotion clipped = smoothedClippedVelocity();
+    diagnostics_.logVerbose("%s Motion %dM, %d<-->%d\n", kSig, numFingers, innermostTouchingFingerID(),
+                            outermostTouchingFingerID());
+    diagnostics_.logVerbose(
+        "%s Motion \t%4.2fdx %4.2fdy %4.2fds %4.2fdr | %5.3f/%5.3fvx %5.3f/%5.3fvy %5.3f/%5.3fvs "
+        "%5.3f/%5.3fvr\n",
+        kSig, pixelDeltas_.x, pixelDeltas_.y, pixelDeltas_.scale, pixelDeltas_.rotate, clipped.x, velocity_.x,
+        clipped.y, velocity_.y, clipped.scale, velocity_.scale, clipped.rotate, velocity_.rotate);
 }
 
 }  // namespace orvane

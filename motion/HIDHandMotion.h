@@ -8,6 +8,7 @@
 #include <limits>
 
 #include "common/HIDTypes.h"
+#include "filter/FilterLogging.h"
 #include "motion/HIDFingerToPathMap.h"
 
 namespace orvane {
@@ -90,8 +91,23 @@ public:
     HID_PROPERTY(float, nondominantAxesRatio, setNondominantAxesRatio)
     HID_PROPERTY(double, tLastPixelDelta, setTLastPixelDelta)
     HID_PROPERTY(HIDPoint, handCentroid, setHandCentroid)
-    HID_PROPERTY(HIDMotion, smoothedVelocity, setSmoothedVelocity)
-    HID_PROPERTY(HIDMotion, smoothedClippedVelocity, setSmoothedClippedVelocity)
+    HIDMotion smoothedVelocity() const { return smoothedVelocity_; }
+    // Leaves smoothedClippedVelocity as it was.
+    void setSmoothedVelocity(HIDMotion value) {
+        smoothedClippedVelocity_ = smoothedClippedVelocity();
+        clippedAxes_ = ClippedAxes::Kept;
+        smoothedVelocity_ = value;
+    }
+    // The smoothed velocity with the axes that did not dominate cleared and the dead zone
+    // applied. Worked out when read, from the smoothed velocity and the axes the last clipping
+    // kept, as nothing on the frame path reads it.
+    HIDMotion smoothedClippedVelocity() const;
+    void setSmoothedClippedVelocity(HIDMotion value) {
+        smoothedClippedVelocity_ = value;
+        clippedAxes_ = ClippedAxes::Kept;
+    }
+    // The same clipping with every value worked out as it goes: the reference for the one above.
+    void clipMotionToDominantAxesLiteral(double frameInterval);
     HID_PROPERTY(HIDMotion, accumulatedDeltas, setAccumulatedDeltas)
     HID_PROPERTY(HIDMotion, accumulatedDeltasWithResting, setAccumulatedDeltasWithResting)
     HID_PROPERTY(HIDMotion, motionDeltas, setMotionDeltas)
@@ -107,9 +123,18 @@ private:
         if (std::fabs(m.rotate) > largest) largest = std::fabs(m.rotate);
         return largest;
     }
+    // What the clipping compares: the weighted scale and rotation speeds, the larger of the
+    // two, and the translation speed.
+    struct DominantAxes {
+        float scale, rotation, scaleOrRotation, translation;
+    };
+    // The smoothing that comes before the clipping, with the speeds the clipping compares.
+    DominantAxes smoothVelocity(double frameInterval);
     // The separations of computeSeparation_mm from the vertical difference and the magnitude.
     void noteSeparation_mm(float dy, float magnitude);
 
+    // The diagnostics flag as the stage last started on a frame.
+    FrameDiagnostics diagnostics_;
     HIDMotion pixelDeltas_{};
     HIDMotion velocity_{};
     HIDMotion absoluteLocation_{};
@@ -130,7 +155,11 @@ private:
     double tLastPixelDelta_ = 0.0;
     HIDPoint handCentroid_{};
     HIDMotion smoothedVelocity_{};
+    // Which axes the last clipping kept of smoothedVelocity_; Kept: smoothedClippedVelocity_
+    // holds the value itself.
+    enum class ClippedAxes : uint8_t { Kept, Translation, Scale, Rotation, ScaleAndRotation };
     HIDMotion smoothedClippedVelocity_{};
+    ClippedAxes clippedAxes_ = ClippedAxes::Kept;
     HIDMotion accumulatedDeltas_{};
     HIDMotion accumulatedDeltasWithResting_{};
     HIDMotion motionDeltas_{};

@@ -38,12 +38,20 @@ HIDPathStateBasic::~HIDPathStateBasic() {
 }
 
 [[gnu::flatten]] bool HIDPathStateBasic::unpackContactFrame(const HIDEventRef& frame, double time) {
+    marks_.diagnostics.takeCopy();
     updateFrameTimestamp(time);
     if (frame) {
         // Clearing paths leaves the frame as it is, so both steps see the same contact count.
         const int numContacts = getNumberOfContacts(frame);
         clearExistingPathLiftoffsAndMasks(numContacts);
         expandAndFilterPackedContacts(*frame, numContacts);
+        // While no contact is loose, the diving-button count visits exactly the paths the
+        // fastest finger's walk visits, in the same order, so one walk does both.
+        if (marks_.looseSlots == 0) {
+            countFingersOnDivingButton(true);
+            return true;
+        }
+        countFingersOnDivingButton(false);
     }
     updateFastestFingerSpeed();
     return true;
@@ -82,7 +90,10 @@ void HIDPathStateBasic::clearExistingPathLiftoffsAndMasksOneByOne(const HIDEvent
 
 void HIDPathStateBasic::expandAndFilterPackedContacts(const HIDEventRef& frame) {
     numNewContacts_ = 0;
-    if (frame) expandAndFilterPackedContacts(*frame, getNumberOfContacts(frame));
+    if (frame) {
+        expandAndFilterPackedContacts(*frame, getNumberOfContacts(frame));
+        countFingersOnDivingButton();
+    }
 }
 
 void HIDPathStateBasic::expandAndFilterPackedContacts(const HIDEvent& frame, int n) {
@@ -100,7 +111,6 @@ void HIDPathStateBasic::expandAndFilterPackedContacts(const HIDEvent& frame, int
         // from it on does: the result depends on child order, on purpose.
         path->filterContactForScreenUI(numNewContacts_ > 0);
     }
-    countFingersOnDivingButton();
 }
 
 int HIDPathStateBasic::getNumberOfContacts(const HIDEventRef& frame) const {
@@ -119,7 +129,9 @@ HIDParserPath* HIDPathStateBasic::findParserPathforPathIDBySearch(int pathID) co
     return nullptr;
 }
 
-int HIDPathStateBasic::countFingersOnDivingButton() {
+int HIDPathStateBasic::countFingersOnDivingButton() { return countFingersOnDivingButton(false); }
+
+inline int HIDPathStateBasic::countFingersOnDivingButton(bool noteDamping) {
     static constexpr const char* kSignature = "-[HIDPathStateBasic countFingersOnDivingButton]";
 
     lastNumTouches_ = numTouches_;
@@ -134,8 +146,10 @@ int HIDPathStateBasic::countFingersOnDivingButton() {
     };
     std::array<Found, kNumPaths> found;
     size_t numFound = 0;
+    if (noteDamping) startNotingDamping();
     forEachPathByID([&](const HIDParserPath* path, int id) {
         found[numFound++] = Found{path, id};
+        if (noteDamping) noteDampingOf(*path);
         const bool touchingFinger = path->isTouching() && path->isFingerOrRestingContact();
         if (touchingFinger && !path->isEdgeContact()) ++numNonEdgeTouches_;
         if (touchingFinger) ++numTouches_;
@@ -153,19 +167,21 @@ int HIDPathStateBasic::countFingersOnDivingButton() {
         const HIDParserPath* path = found[k].path;
         const int id = found[k].id;
         // Asked first, so the edge test of every path runs only for the diagnostics.
-        if (verboseDebugEnabled()) {
-            logVerbose("%s [parserPath isEdgeContact] %d _numNonEdgeTouches %d [parserPath isTouching] %d "
-                       "[parserPath isFingerOrRestingContact ] %d",
-                       kSignature, path->isEdgeContact(), numNonEdgeTouches_, path->isTouching(),
-                       path->isFingerOrRestingContact());
+        if (frameDiagnostics().verboseDebugEnabled()) {
+            frameDiagnostics().logVerbose(
+                "%s [parserPath isEdgeContact] %d _numNonEdgeTouches %d [parserPath isTouching] %d "
+                "[parserPath isFingerOrRestingContact ] %d",
+                kSignature, path->isEdgeContact(), numNonEdgeTouches_, path->isTouching(),
+                path->isFingerOrRestingContact());
         }
         // An edge-only palm-type contact counts only while at most one non-edge finger touches.
         const bool takesPart = path->isTouching() && (path->isFingerOrRestingContact() ||
                                                       (path->isEdgeContact() && numNonEdgeTouches_ <= 1));
         if (!takesPart) continue;
         const float score = path->currentContact().position.y - path->peakDisplacement();
-        logVerbose("%s in here bottom_most_pidx %d peakdisplacement %f ypos_plus %f bottom_most_y_mm%f", kSignature,
-                   bestID, path->peakDisplacement(), score, bestScore);
+        frameDiagnostics().logVerbose(
+            "%s in here bottom_most_pidx %d peakdisplacement %f ypos_plus %f bottom_most_y_mm%f", kSignature, bestID,
+            path->peakDisplacement(), score, bestScore);
         if (score > bestScore) {
             secondScore = bestScore;
             secondID = bestID;
@@ -201,12 +217,67 @@ int HIDPathStateBasic::countFingersOnDivingButton() {
             }
         }
     }
-    logVerbose("%s _numFingersOnDivingButton %d _numEdgeTouchesOnDivingButton %d", kSignature,
-               numFingersOnDivingButton_, numEdgeTouchesOnDivingButton_);
+    frameDiagnostics().logVerbose("%s _numFingersOnDivingButton %d _numEdgeTouchesOnDivingButton %d", kSignature,
+                                  numFingersOnDivingButton_, numEdgeTouchesOnDivingButton_);
     return numFingersOnDivingButton_;
 }
 
 void HIDPathStateBasic::updateFastestFingerSpeed() {
+    startNotingDamping();
+    // By slot: a path whose contact carries another ID takes no part.
+    forEachPathInOwnSlot([this](const HIDParserPath* path, int) { noteDampingOf(*path); });
+}
+
+inline void HIDPathStateBasic::startNotingDamping() {
+    maxFingerSpeed_ = 0.0f;
+    numKeptDamping_ = 0;
+    fastestSpeedKept_ = true;
+    fastestVelocityKept_ = true;
+}
+
+inline void HIDPathStateBasic::noteDampingOf(const HIDParserPath& path) {
+    if (!path.isTouching()) return;
+    keptDamping_[numKeptDamping_++] = Damping{path.dampedSpeed(), path.dampedVelocity()};
+
+    const HIDPoint d = path.currentContact().velocity;
+    const float squares = d.x * d.x + d.y * d.y;
+    const double length = std::sqrt(static_cast<double>(squares));
+    if (length > maxFingerSpeed_) maxFingerSpeed_ = static_cast<float>(length);
+}
+
+// Weighted means that favour the fastest finger, summed in the order the paths were found; the
+// velocity components come out as magnitudes (the sign is squared away), on purpose.
+float HIDPathStateBasic::dampedSpeedOfFastestFinger() const {
+    if (!fastestSpeedKept_) return dampedSpeedOfFastestFinger_;
+    float sumSpeed = 0.0f, sumSpeedSquared = 0.0f;
+    for (size_t i = 0; i < numKeptDamping_; ++i) {
+        const float s = keptDamping_[i].speed;
+        sumSpeed += s;
+        sumSpeedSquared += s * s;
+    }
+    return sumSpeed > 0 ? sumSpeedSquared / sumSpeed : 0.0f;
+}
+
+HIDPoint HIDPathStateBasic::dampedVelocityOfFastestFinger() const {
+    if (!fastestVelocityKept_) return dampedVelocityOfFastestFinger_;
+    float sumAbsX = 0.0f, sumXSquared = 0.0f;
+    float sumAbsY = 0.0f, sumYSquared = 0.0f;
+    for (size_t i = 0; i < numKeptDamping_; ++i) {
+        const HIDPoint v = keptDamping_[i].velocity;
+        sumAbsX += fabsf(v.x);
+        sumXSquared += v.x * v.x;
+        sumAbsY += fabsf(v.y);
+        sumYSquared += v.y * v.y;
+    }
+    HIDPoint velocity{0.0f, 0.0f};
+    if (sumAbsX > 0) velocity.x = sumXSquared / sumAbsX;
+    if (sumAbsY > 0) velocity.y = sumYSquared / sumAbsY;
+    return velocity;
+}
+
+void HIDPathStateBasic::updateFastestFingerSpeedLiteral() {
+    fastestSpeedKept_ = false;
+    fastestVelocityKept_ = false;
     dampedSpeedOfFastestFinger_ = 0.0f;
     dampedVelocityOfFastestFinger_ = HIDPoint{0.0f, 0.0f};
     maxFingerSpeed_ = 0.0f;

@@ -116,7 +116,13 @@ public:
 
     int countFingersOnDivingButton();
     bool anyNewContact() const { return numNewContacts_ > 0; }
+    // Keeps the touching paths' damped speeds and velocities for the fastest finger's
+    // figures, which are worked out when read (nothing of the frame reads them), and works out
+    // maxFingerSpeed.
     void updateFastestFingerSpeed();
+    // The same, working the fastest finger's figures out at once: the reference for the one
+    // above.
+    void updateFastestFingerSpeedLiteral();
     bool calculateCentroidOfPaths(HIDPoint* centroid) const;
 
     const std::vector<std::shared_ptr<HIDParserPath>>& paths() const { return paths_; }
@@ -128,15 +134,34 @@ public:
     HID_PROPERTY(int, bottomDivingPathIndex, setBottomDivingPathIndex)
     HID_PROPERTY(int, numFingersOnDivingButton, setNumFingersOnDivingButton)
     HID_PROPERTY(int, numEdgeTouchesOnDivingButton, setNumEdgeTouchesOnDivingButton)
-    HID_PROPERTY(float, dampedSpeedOfFastestFinger, setDampedSpeedOfFastestFinger)
-    HID_PROPERTY(HIDPoint, dampedVelocityOfFastestFinger, setDampedVelocityOfFastestFinger)
+    float dampedSpeedOfFastestFinger() const;
+    void setDampedSpeedOfFastestFinger(float value) {
+        dampedSpeedOfFastestFinger_ = value;
+        fastestSpeedKept_ = false;
+    }
+    HIDPoint dampedVelocityOfFastestFinger() const;
+    void setDampedVelocityOfFastestFinger(HIDPoint value) {
+        dampedVelocityOfFastestFinger_ = value;
+        fastestVelocityKept_ = false;
+    }
     HID_PROPERTY(float, maxFingerSpeed, setMaxFingerSpeed)
     HID_PROPERTY(unsigned int, currentlyTouchedZones, setCurrentlyTouchedZones)
+
+protected:
+    // The table's copy of the diagnostics flag (taken as each frame is unpacked), which its
+    // stages and paths test.
+    const FrameDiagnostics& frameDiagnostics() const { return marks_.diagnostics; }
 
 private:
     // The two steps of unpacking, given the frame's contact count.
     void clearExistingPathLiftoffsAndMasks(int numContacts);
     void expandAndFilterPackedContacts(const HIDEvent& frame, int numContacts);
+    // The diving-button count; with noteDamping, also what updateFastestFingerSpeed notes of
+    // each path its walk visits (the same paths while no contact is loose).
+    int countFingersOnDivingButton(bool noteDamping);
+    // updateFastestFingerSpeed in two steps: before the walk, and for each path it visits.
+    void startNotingDamping();
+    void noteDampingOf(const HIDParserPath& path);
 
     static constexpr int kFirstSlot = 1;
     static constexpr int kLastSlot = 14;
@@ -164,6 +189,16 @@ private:
     int bottomDivingPathIndex_ = 0;
     int numFingersOnDivingButton_ = 0;
     int numEdgeTouchesOnDivingButton_ = 0;
+    // The damped speed and velocity of each touching path as updateFastestFingerSpeed found
+    // them, in slot order; while a Kept flag is set, the figure is worked out from these.
+    struct Damping {
+        float speed;
+        HIDPoint velocity;
+    };
+    std::array<Damping, kNumPaths> keptDamping_{};
+    size_t numKeptDamping_ = 0;
+    bool fastestSpeedKept_ = false;
+    bool fastestVelocityKept_ = false;
     float dampedSpeedOfFastestFinger_ = 0.0f;
     HIDPoint dampedVelocityOfFastestFinger_{};
     float maxFingerSpeed_ = 0.0f;

@@ -96,7 +96,8 @@ void stableSortByLength(HIDPoint* first, HIDPoint* last) {
 }  // namespace
 
 void HIDPathStates::updateButtonState(const HIDEventRef& frame) {
-    logVerbose("%s _previous button state %d ", "-[HIDPathStates updateButtonState:]", previousButtonState_);
+    frameDiagnostics().logVerbose("%s _previous button state %d ", "-[HIDPathStates updateButtonState:]",
+                                  previousButtonState_);
     // Compares the two values the previous frame left, so a change read in one frame is
     // time-stamped with the next frame's time; the one-frame lag is intended.
     if (previousButtonState_ != buttonState_) {
@@ -147,7 +148,7 @@ void HIDPathStates::updateDivingBoardDisplacements(bool* makeOrBreak) {
         gathered.add(path, id);
         range.add(path);
     });
-    gathered.finish();
+    gathered.finish(frameDiagnostics());
     const float similarity = range.similarity();
     breakOutOfRestingThumb(&similarity);
     setRestingFlag(frame);
@@ -158,9 +159,9 @@ void HIDPathStates::setThumbZoneFlag(HIDParserPath* path, int id) {
     const bool resting =
         restingThumbExists_ && id == bottomDivingPathIndex() && !(engagedinGesture_ && numTouches() == 2);
     path->setIsRestingInThumbZone(resting);
-    logVerbose("%s restingthumexists %d divingpathID %d pathID %d isRestingthumbinzone %d",
-               "-[HIDPathStates postFilteringTasks:]", restingThumbExists_, bottomDivingPathIndex(), id,
-               path->isRestingInThumbZone());
+    frameDiagnostics().logVerbose("%s restingthumexists %d divingpathID %d pathID %d isRestingthumbinzone %d",
+                                  "-[HIDPathStates postFilteringTasks:]", restingThumbExists_, bottomDivingPathIndex(),
+                                  id, path->isRestingInThumbZone());
 }
 
 void HIDPathStates::postFilteringTasksOneByOne(const HIDEventRef& frame) {
@@ -184,13 +185,14 @@ void HIDPathStates::setRestingFlag(const HIDEventRef& frame) {
         if (path && path->isRestingInThumbZone() && path->isTouching() && path->wasTouching()) {
             const int64_t mask = child->integerValueForField(kHIDEventFieldDigitizerEventMask);
             child->setIntegerValue(mask | kHIDDigitizerEventResting, kHIDEventFieldDigitizerEventMask);
-            logVerbose("%s restingthumb path index %d eventmask %d", "-[HIDPathStates setRestingFlag:]", id,
-                       static_cast<int>(mask));
+            frameDiagnostics().logVerbose("%s restingthumb path index %d eventmask %d",
+                                          "-[HIDPathStates setRestingFlag:]", id, static_cast<int>(mask));
         }
         // Asked first, so the mask is read back only for the diagnostics.
-        if (verboseDebugEnabled()) {
-            logVerbose("%s after eventmask %d path index %d", "-[HIDPathStates setRestingFlag:]",
-                       static_cast<int>(child->integerValueForField(kHIDEventFieldDigitizerEventMask)), id);
+        if (frameDiagnostics().verboseDebugEnabled()) {
+            frameDiagnostics().logVerbose(
+                "%s after eventmask %d path index %d", "-[HIDPathStates setRestingFlag:]",
+                static_cast<int>(child->integerValueForField(kHIDEventFieldDigitizerEventMask)), id);
         }
     }
 }
@@ -211,7 +213,7 @@ void HIDPathStates::checkForRestingThumb(bool* makeOrBreak) {
     if (bottom < 1) return;
     HIDParserPath* thumb = getParserPath(bottom);
     const double tMake = thumb ? thumb->timestamps().t_makeTouch : 0.0;
-    logVerbose("%s possibly diving path %d", "-[HIDPathStates checkForRestingThumb]", bottom);
+    frameDiagnostics().logVerbose("%s possibly diving path %d", "-[HIDPathStates checkForRestingThumb]", bottom);
 
     // Another finger touches, and not three or more away from the edges.
     const bool otherFingerTouches =
@@ -247,7 +249,8 @@ void HIDPathStates::checkForRestingThumb(bool* makeOrBreak) {
     if ((thumbLike && restedInZone) || (buttonDown && otherFingerTouches) ||
         (!buttonDown && timedOut && otherFingerTouches)) {
         restingThumbExists_ = true;
-        logVerbose("%s RESTING THUMB divingpathID %d", "-[HIDPathStates checkForRestingThumb]", bottom);
+        frameDiagnostics().logVerbose("%s RESTING THUMB divingpathID %d", "-[HIDPathStates checkForRestingThumb]",
+                                      bottom);
     }
 }
 
@@ -256,7 +259,7 @@ void HIDPathStates::updateSpeedSymmetriesOfAllPaths() {
     // the others of the same list, which is what asking every path in turn would gather.
     SpeedSymmetryFingers gathered;
     forEachPathByID([&gathered](HIDParserPath* path, int id) { gathered.add(path, id); });
-    gathered.finish();
+    gathered.finish(frameDiagnostics());
 }
 
 void HIDPathStates::SpeedSymmetryFingers::add(HIDParserPath* path, int id) {
@@ -270,9 +273,8 @@ void HIDPathStates::SpeedSymmetryFingers::add(HIDParserPath* path, int id) {
     }
 }
 
-void HIDPathStates::SpeedSymmetryFingers::finish() {
-
-    if (numFingers == 2 && !verboseDebugEnabled()) {
+void HIDPathStates::SpeedSymmetryFingers::finish(const FrameDiagnostics& diagnostics) {
+    if (numFingers == 2 && !diagnostics.verboseDebugEnabled()) {
         // Two fingers: each one's symmetry is against the other alone, and the cosine between
         // them is the same both ways round (the products and their sums are the same numbers).
         const float cosine = cosineBetween(velocities[0], velocities[1]);
@@ -461,7 +463,7 @@ void HIDPathStates::breakOutOfRestingThumb(const float* knownSimilarity) {
 
 void HIDPathStates::calculateNewHandCenter(const HIDEventRef& frame) {
     if (!frame) {
-        logVerbose("%s hand center (%f, %f)", "-[HIDPathStates calculateNewHandCenter:]", 0.0, 0.0);
+        frameDiagnostics().logVerbose("%s hand center (%f, %f)", "-[HIDPathStates calculateNewHandCenter:]", 0.0, 0.0);
         return;
     }
     double sumX = 0.0;
@@ -481,10 +483,10 @@ void HIDPathStates::calculateNewHandCenter(const HIDEventRef& frame) {
         frame->setDoubleValue(sumX / count, kHIDEventFieldDigitizerX);
         frame->setDoubleValue(sumY / count, kHIDEventFieldDigitizerY);
     }
-    if (verboseDebugEnabled()) {
-        logVerbose("%s hand center (%f, %f)", "-[HIDPathStates calculateNewHandCenter:]",
-                   frame->doubleValueForField(kHIDEventFieldDigitizerX),
-                   frame->doubleValueForField(kHIDEventFieldDigitizerY));
+    if (frameDiagnostics().verboseDebugEnabled()) {
+        frameDiagnostics().logVerbose("%s hand center (%f, %f)", "-[HIDPathStates calculateNewHandCenter:]",
+                                      frame->doubleValueForField(kHIDEventFieldDigitizerX),
+                                      frame->doubleValueForField(kHIDEventFieldDigitizerY));
     }
 }
 

@@ -78,7 +78,8 @@ private:
         // slot, its symmetry cleared when it does not touch.
         void add(HIDParserPath* path, int id);
         // Sets every gathered finger's symmetry against the others.
-        void finish();
+        // diagnostics: the table's copy of the diagnostics flag (the cosines are logged when on).
+        void finish(const FrameDiagnostics& diagnostics);
     };
     // The slowest and fastest average speed of the touching fingers.
     struct SpeedRange {

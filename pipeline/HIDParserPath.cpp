@@ -24,8 +24,8 @@ float lengthOf(HIDPoint p) { return sqrtf(p.x * p.x + p.y * p.y); }
 
 constexpr const char* kFilterSignature = "-[HIDParserPath filterContactForScreenUI:]";
 
-// The diagnostics of the screen-UI filter, out of its way: each is called when
-// verboseDebugEnabled() and logs what logVerbose would.
+// The diagnostics of the screen-UI filter, out of its way: each is called when the diagnostics
+// are enabled and logs what logVerbose would.
 __attribute__((noinline, cold)) void logHysteresisMove(HIDPoint center, HIDPoint oldCenter, int32_t pathID) {
     LoggingServiceFilterVerbose()->log(LogLevel::Debug,
                                        "%s hysteresis center (%f,%f), pulled_hysteresis_center (%f,%f) path_id %d",
@@ -42,6 +42,14 @@ __attribute__((noinline, cold)) void logFilteredContact(const HIDContact& cur, c
 
 }  // namespace
 
+float HIDParserPath::engagedSpeed() const { return engagedSpeedIsLength_ ? lengthOf(engagedVelocity_) : engagedSpeed_; }
+
+void HIDParserPath::setEngagedVelocity(HIDPoint value) {
+    engagedSpeed_ = engagedSpeed();
+    engagedSpeedIsLength_ = false;
+    engagedVelocity_ = value;
+}
+
 HIDParserPath::HIDParserPath(float height, float width)
     : surfaceDimensions_{width, height}, bounds_(EdgeBounds::of(surfaceDimensions_)) {}
 
@@ -53,8 +61,9 @@ void HIDParserPath::setPeakDisplacement() {
 inline void HIDParserPath::raisePeakDisplacement() {
     const HIDPoint d{currentContact_.position.x - initialPosition_.x, currentContact_.position.y - initialPosition_.y};
     const float distance = lengthOf(d);
-    logVerbose("%s initial position (%f, %f) current (%f, %f)", "-[HIDParserPath setPeakDisplacement]",
-               initialPosition_.x, initialPosition_.y, currentContact_.position.x, currentContact_.position.y);
+    link_.marks->diagnostics.logVerbose("%s initial position (%f, %f) current (%f, %f)",
+                                        "-[HIDParserPath setPeakDisplacement]", initialPosition_.x, initialPosition_.y,
+                                        currentContact_.position.x, currentContact_.position.y);
     if (distance > peakDisplacement_) peakDisplacement_ = distance;
 }
 
@@ -201,7 +210,8 @@ void HIDParserPath::filterContactForScreenUI(bool strongDamping) {
         (cur.position.x != 0 || cur.position.y != 0) && (prev.position.x != 0 || prev.position.y != 0)) {
         const HIDPoint oldCenter = hysteresisCenter_;
         applyAbsolutePixelHysteresis(cur.position, hysteresisCenter_, prev.position, kHysteresisRadius_mm);
-        if (verboseDebugEnabled()) [[unlikely]] logHysteresisMove(hysteresisCenter_, oldCenter, cur.path_id);
+        if (link_.marks->diagnostics.verboseDebugEnabled()) [[unlikely]]
+            logHysteresisMove(hysteresisCenter_, oldCenter, cur.path_id);
         pixelDelta_.x = hysteresisCenter_.x - oldCenter.x;
         pixelDelta_.y = hysteresisCenter_.y - oldCenter.y;
         cumulativeDeltas_.x += pixelDelta_.x;
@@ -219,10 +229,11 @@ void HIDParserPath::filterContactForScreenUI(bool strongDamping) {
     }
 
     engagedVelocity_ = cur.velocity;
-    engagedSpeed_ = lengthOf(cur.velocity);
+    engagedSpeedIsLength_ = true;
     // The table is marked above for the whole filter.
     dampVelocity(strongDamping);
-    if (verboseDebugEnabled()) [[unlikely]] logFilteredContact(cur, prev, pixelDelta_);
+    if (link_.marks->diagnostics.verboseDebugEnabled()) [[unlikely]]
+        logFilteredContact(cur, prev, pixelDelta_);
 }
 
 void HIDParserPath::filterContactForScreenUILiteral(bool strongDamping) {
@@ -257,6 +268,7 @@ void HIDParserPath::filterContactForScreenUILiteral(bool strongDamping) {
 
     engagedVelocity_ = cur.velocity;
     engagedSpeed_ = lengthOf(cur.velocity);
+    engagedSpeedIsLength_ = false;
     updateDampedVelocityLiteral(strongDamping);
     logVerbose("%s Current position (%f,%f), Previous position (%f,%f) pixel delta (%f, %f) path_id %d", kSignature,
                cur.position.x, cur.position.y, prev.position.x, prev.position.y, pixelDelta_.x, pixelDelta_.y,

@@ -6,6 +6,7 @@
 #include <memory>
 
 #include "common/HIDTypes.h"
+#include "filter/FilterLogging.h"
 #include "platform/HIDEvent.h"
 
 namespace orvane {
@@ -19,6 +20,8 @@ struct HIDPathTableMarks {
     uint32_t ownSlots = 0;
     // Bit s clear: the path of slot s is as clear() leaves it, so clearing it changes nothing.
     uint32_t dirtySlots = 0;
+    // The table's copy of the diagnostics flag, which its paths test as they read contacts.
+    FrameDiagnostics diagnostics;
 };
 
 // A property that clear() resets: setting it tells the path table the path is no longer clear.
@@ -145,7 +148,13 @@ public:
     HID_PROPERTY(bool, wasRestingInThumbZone, setWasRestingInThumbZone)
     HID_PROPERTY(bool, thumbMovementTimedOut, setThumbMovementTimedOut)
     HID_PROPERTY(bool, thumbAboveTRZOnTouchdown, setThumbAboveTRZOnTouchdown)
-    HID_PROPERTY(float, engagedSpeed, setEngagedSpeed)
+    // engagedSpeed is the length of engagedVelocity whenever the screen-UI filter last set
+    // both (nothing of the frame reads it, so it is worked out when read).
+    float engagedSpeed() const;
+    void setEngagedSpeed(float value) {
+        engagedSpeed_ = value;
+        engagedSpeedIsLength_ = false;
+    }
     HID_PROPERTY(float, _2F_speed_symmetry, set_2F_speed_symmetry)
     HID_CLEARED_PROPERTY(float, dampedSpeed, setDampedSpeed)
     float peakDisplacement() const { return peakDisplacement_; }
@@ -162,7 +171,9 @@ public:
     HID_PROPERTY(HIDPoint, ellipseHysteresisOffset, setEllipseHysteresisOffset)
     HID_CLEARED_PROPERTY(HIDPoint, pixelDelta, setPixelDelta)
     HID_CLEARED_PROPERTY(HIDPoint, cumulativeDeltas, setCumulativeDeltas)
-    HID_PROPERTY(HIDPoint, engagedVelocity, setEngagedVelocity)
+    HIDPoint engagedVelocity() const { return engagedVelocity_; }
+    // Leaves engagedSpeed as it was.
+    void setEngagedVelocity(HIDPoint value);
     HID_CLEARED_PROPERTY(HIDPoint, dampedVelocity, setDampedVelocity)
     const HIDPathTimestamps& timestamps() const { return timestamps_; }
     HIDPathTimestamps& timestamps() { return timestamps_; }
@@ -225,7 +236,9 @@ private:
     bool wasRestingInThumbZone_ = false;
     bool thumbMovementTimedOut_ = false;
     bool thumbAboveTRZOnTouchdown_ = false;
+    // Read only while engagedSpeedIsLength_ is false.
     float engagedSpeed_ = 0.0f;
+    bool engagedSpeedIsLength_ = false;
     float _2F_speed_symmetry_ = 0.0f;
     float dampedSpeed_ = 0.0f;
     float peakDisplacement_ = 0.0f;

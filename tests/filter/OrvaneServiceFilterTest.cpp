@@ -268,3 +268,16 @@ TEST(Version, NumberAndTextAreExported) {
     EXPECT_STREQ(reinterpret_cast<const char*>(OrvaneServiceFilterVersionString),
                  "@(#)PROGRAM:OrvaneServiceFilter  PROJECT:Orvane-27\n");
 }
+
+// Not an internal build: a stage's copy of the diagnostics flag says no whatever the log
+// level, whether it was taken before or after the flag learnt the build's kind.
+TEST(Diagnostics, OnAPublicBuildAStagesCopyOfTheFlagSaysNo) {
+    Logging::setDebugEnabled(true);
+    FrameDiagnostics before;
+    EXPECT_FALSE(before.verboseDebugEnabled());
+    FrameDiagnostics after;
+    after.takeCopy();
+    EXPECT_FALSE(after.verboseDebugEnabled());
+    EXPECT_FALSE(before.verboseDebugEnabled());
+    Logging::setDebugEnabled(false);
+}

@@ -9,6 +9,8 @@
 //   so a frame whose views picked the same pair shares them;
 // - the location's rotate, worked out when read, is bit for bit the direction the extraction
 //   gave (0 without a pair), through every way the location is set or cleared.
+// - the smoothed clipped velocity, worked out when read, is bit for bit what clipping at once
+//   leaves, through every way the velocities are set, cleared or copied.
 
 #include <gtest/gtest.h>
 
@@ -306,6 +308,98 @@ TEST(HandMotionForms, LocationDirectionFollowsEverySetAndClear) {
     }
     EXPECT_EQ(differences, 0);
     EXPECT_GT(withDirection, 5000);
+}
+
+// The smoothed clipped velocity, worked out when read from the smoothed velocity and the axes
+// the clipping kept, is bit for bit what clipping it at once leaves, through every way the
+// velocities are set or cleared in between; the rest of what the clipping leaves is the same
+// too. Two motions go through the same steps, one clipping each way.
+TEST(HandMotionForms, ClippedVelocityWorkedOutWhenReadFollowsEverySetAndClear) {
+    std::mt19937 random(20261122);
+    auto pick = [&random](int low, int high) { return std::uniform_int_distribution<int>(low, high)(random); };
+    // Small steps, so that the scale and rotation speeds often tie; now and then 0.
+    auto any = [&]() { return pick(0, 4) == 0 ? 0.0f : static_cast<float>(pick(-40, 40)) / 4.0f; };
+    auto anyMotion = [&]() { return HIDMotion{any(), any(), any(), any()}; };
+    HIDHandMotion whenRead;
+    HIDHandMotion atOnce;
+    int differences = 0;
+    int clips = 0;
+    int kinds[4] = {0, 0, 0, 0};  // translation, scale, rotation, scale and rotation tied
+    for (int step = 0; step < 40000; ++step) {
+        switch (pick(0, 11)) {
+            case 0: {
+                const HIDMotion v = anyMotion();
+                whenRead.setSmoothedVelocity(v);
+                atOnce.setSmoothedVelocity(v);
+                break;
+            }
+            case 1: {
+                const HIDMotion v = anyMotion();
+                whenRead.setSmoothedClippedVelocity(v);
+                atOnce.setSmoothedClippedVelocity(v);
+                break;
+            }
+            case 2: {
+                const bool clearLocation = pick(0, 1) == 1;
+                whenRead.clearHandMotion(clearLocation);
+                atOnce.clearHandMotion(clearLocation);
+                break;
+            }
+            case 3: {
+                // A copy carries what the clipping kept.
+                const HIDHandMotion copy = whenRead;
+                whenRead = copy;
+                break;
+            }
+            case 4: {
+                const float separation = static_cast<float>(pick(0, 120));
+                whenRead.setInnermostOutermostSeparation_mm(separation);
+                atOnce.setInnermostOutermostSeparation_mm(separation);
+                break;
+            }
+            case 5: {
+                const HIDMotion d = anyMotion();
+                whenRead.setPixelDeltas(d);
+                atOnce.setPixelDeltas(d);
+                whenRead.setPixelDeltasWithResting(d);
+                atOnce.setPixelDeltasWithResting(d);
+                break;
+            }
+            default: {
+                const HIDMotion v = anyMotion();
+                whenRead.setVelocity(v);
+                atOnce.setVelocity(v);
+                // Frame intervals in ticks: none, and ordinary ones of 8 ms and 11 ms.
+                const double interval = pick(0, 5) == 0 ? 0.0 : (pick(0, 1) == 0 ? 8000000.0 : 11000000.0);
+                whenRead.clipMotionToDominantAxes(interval);
+                atOnce.clipMotionToDominantAxesLiteral(interval);
+                const HIDMotion c = atOnce.smoothedClippedVelocity();
+                if (c.x != 0.0f || c.y != 0.0f) {
+                    ++kinds[0];
+                } else if (c.scale != 0.0f && c.rotate != 0.0f) {
+                    ++kinds[3];
+                } else if (c.scale != 0.0f) {
+                    ++kinds[1];
+                } else if (c.rotate != 0.0f) {
+                    ++kinds[2];
+                }
+                ++clips;
+                break;
+            }
+        }
+        const std::string a = hex(whenRead.smoothedClippedVelocity()) + "| " + hex(whenRead.smoothedVelocity()) + "| " +
+                              hex(whenRead.pixelDeltas()) + "| " + hex(whenRead.pixelDeltasWithResting()) + "| " +
+                              hex(whenRead.nondominantAxesRatio()) + hex(whenRead.smoothedTranslationSpeed());
+        const std::string b = hex(atOnce.smoothedClippedVelocity()) + "| " + hex(atOnce.smoothedVelocity()) + "| " +
+                              hex(atOnce.pixelDeltas()) + "| " + hex(atOnce.pixelDeltasWithResting()) + "| " +
+                              hex(atOnce.nondominantAxesRatio()) + hex(atOnce.smoothedTranslationSpeed());
+        if (a != b && differences++ < 3)
+            ADD_FAILURE() << "step " << step << ":\n when read: " << a << "\n at once:   " << b;
+    }
+    EXPECT_EQ(differences, 0);
+    EXPECT_GT(clips, 20000);
+    // Every way the clipping goes was taken, ties of scale and rotation too.
+    for (int kind : kinds) EXPECT_GT(kind, 50);
 }
 
 }  // namespace

@@ -337,7 +337,10 @@ TEST(ParserPathForms, OneMarkAndKeptDampingWeightsAgreeWithTheStepByStepFormsOnR
     for (int round = 0; round < 4000; ++round) {
         const HIDParserPath start = randomPath(rng);
         const int slot = std::uniform_int_distribution<int>(-1, kSlots - 1)(rng);
-        HIDPathTableMarks marks{static_cast<uint32_t>(rng()), static_cast<uint32_t>(rng()), static_cast<uint32_t>(rng())};
+        HIDPathTableMarks marks;
+        marks.looseSlots = static_cast<uint32_t>(rng());
+        marks.ownSlots = static_cast<uint32_t>(rng());
+        marks.dirtySlots = static_cast<uint32_t>(rng());
         PathPair pair(start, slot < 0 ? 0 : slot, marks);
         if (slot < 0) {
             pair.literal.linkToTable(-1, nullptr);
@@ -373,6 +376,59 @@ TEST(ParserPathForms, OneMarkAndKeptDampingWeightsAgreeWithTheStepByStepFormsOnR
         }
     }
     EXPECT_EQ(checked, 4000 * 8);
+}
+
+// engagedSpeed, worked out when read, is the length of the velocity the screen-UI filter last
+// set, as working it out at once gave, through every way the speed and the velocity are set:
+// a model keeps the speed as the plain form would.
+TEST(ParserPathForms, EngagedSpeedWorkedOutWhenReadFollowsEverySet) {
+    std::mt19937 rng(20261122);
+    auto pick = [&rng](int low, int high) { return std::uniform_int_distribution<int>(low, high)(rng); };
+    HIDParserPath path(50.0f, 100.0f);
+    float model = 0.0f;
+    int differences = 0;
+    int filtered = 0;
+    for (int step = 0; step < 20000; ++step) {
+        switch (pick(0, 7)) {
+            case 0: {
+                const float speed = static_cast<float>(pick(0, 40)) / 4.0f;
+                path.setEngagedSpeed(speed);
+                model = speed;
+                break;
+            }
+            case 1:
+                // The speed stays as it was.
+                path.setEngagedVelocity(HIDPoint{static_cast<float>(pick(-9, 9)), static_cast<float>(pick(-9, 9))});
+                break;
+            case 2:
+                // The speed survives a clear.
+                path.clear();
+                break;
+            case 3: {
+                const HIDParserPath copy = path;
+                if (!sameBits(copy.engagedSpeed(), model)) ++differences;
+                break;
+            }
+            default: {
+                HIDEventRef contact = HIDEvent::create(kHIDEventTypeDigitizer, 1);
+                contact->setIntegerValue(pick(0, 1), kHIDEventFieldDigitizerIndex);
+                contact->setIntegerValue(pick(0, 4) == 0 ? 0 : 1, kHIDEventFieldDigitizerTouch);
+                contact->setDoubleValue(pick(1, 99) / 100.0, kHIDEventFieldDigitizerX);
+                contact->setDoubleValue(pick(1, 99) / 100.0, kHIDEventFieldDigitizerY);
+                path.updateCurPrevContactsWith(*contact, static_cast<double>(step) * 8000000.0);
+                path.filterContactForScreenUI(pick(0, 1) == 1);
+                const HIDPoint v = path.engagedVelocity();
+                model = sqrtf(v.x * v.x + v.y * v.y);
+                if (model > 0.0f) ++filtered;
+                break;
+            }
+        }
+        if (!sameBits(path.engagedSpeed(), model) && differences++ < 3) {
+            ADD_FAILURE() << "step " << step << ": " << path.engagedSpeed() << " expected " << model;
+        }
+    }
+    EXPECT_EQ(differences, 0);
+    EXPECT_GT(filtered, 2000);
 }
 
 }  // namespace

@@ -1,7 +1,9 @@
 // The path table's walks visit only the paths that can take part and skip clearing paths that
 // are already clear; they give what looking at every slot in turn gives: on every frame of the
 // random sessions, and on tables whose paths are changed in every way a path allows, from
-// outside included.
+// outside included. The fastest finger's figures, kept as the damping of each touching path and
+// worked out when read (noted in the diving-button walk while no contact is loose), are what
+// working them out at once in their own walk gives.
 
 #include <gtest/gtest.h>
 
@@ -283,6 +285,136 @@ TEST(PathWalk, PostFilteringInOneWalkDoesWhatTheStepsOneAfterTheOtherDo) {
     EXPECT_EQ(differences, 0);
     EXPECT_GT(frames, 5000);
     EXPECT_GT(restingFrames, frames / 50);  // resting thumbs were among them
+}
+
+// What the unpacking leaves of the fastest finger and the diving-button count, bit for bit.
+std::string fastestFingerOf(const HIDPathStateBasic& t) {
+    return hex(t.dampedSpeedOfFastestFinger()) + text(t.dampedVelocityOfFastestFinger()) + hex(t.maxFingerSpeed());
+}
+std::string countsOf(const HIDPathStateBasic& t) {
+    return std::to_string(t.numTouches()) + " " + std::to_string(t.numNonEdgeTouches()) + " " +
+           std::to_string(t.numPalms()) + " " + std::to_string(t.bottomDivingPathIndex()) + " " +
+           std::to_string(t.numFingersOnDivingButton()) + " " + std::to_string(t.numEdgeTouchesOnDivingButton());
+}
+
+// "" when the fastest finger's figures the table shows (kept damping, worked out when read,
+// noted in the diving-button walk while no contact is loose) are what working them out at once
+// in their own walk gives, and the diving-button count is what counting again gives. Leaves
+// the table as the plain forms set it.
+std::string fastestFingerDifference(HIDPathStateBasic& table) {
+    const std::string kept = fastestFingerOf(table);
+    const std::string counted = countsOf(table);
+    const int lastNumTouches = table.lastNumTouches();
+    table.updateFastestFingerSpeedLiteral();
+    table.countFingersOnDivingButton();
+    table.setLastNumTouches(lastNumTouches);
+    const std::string literal = fastestFingerOf(table);
+    if (kept != literal) return "fastest finger: " + kept + "\nat once:       " + literal;
+    if (counted != countsOf(table)) return "counts: " + counted + "\nagain:  " + countsOf(table);
+    return "";
+}
+
+// True when some contact carries an ID other than its slot's or none.
+bool anyLooseContact(const HIDPathStateBasic& table) {
+    for (int s = 1; s < HIDPathStateBasic::kNumPaths; ++s) {
+        const int32_t id = table.getParserPath(s)->currentContact().path_id;
+        if (id != 0 && id != s) return true;
+    }
+    return false;
+}
+
+TEST(PathWalk, FastestFingerFromKeptDampingIsWhatWorkingItOutAtOnceGivesOnTheRandomSessions) {
+    int frames = 0;
+    int differences = 0;
+    int movingFrames = 0;
+    perf::replayRandomSessions([&](HIDParser& parser, const HIDEventRef&) {
+        HIDPathStates& table = *parser.pathStates();
+        if (table.dampedSpeedOfFastestFinger() > 0.0f && table.numTouches() >= 2) ++movingFrames;
+        const std::string difference = fastestFingerDifference(table);
+        if (!difference.empty() && differences++ < 3) ADD_FAILURE() << "frame " << frames << ": " << difference;
+        ++frames;
+    });
+    EXPECT_EQ(differences, 0);
+    EXPECT_GT(movingFrames, frames / 4);  // several fingers moving on many of them
+}
+
+// Paths changed from outside, loose contacts among them, between frames of one, two or three
+// contacts: the unpacking's figures agree with the plain forms whether or not a contact was
+// loose, and stay as they were, like stored figures, when the paths change afterwards.
+TEST(PathWalk, FastestFingerFromKeptDampingAgreesAfterPathsAreChangedInEveryWay) {
+    RandomChanges changes(4242);
+    HIDPathStates table(500.0f, 1000.0f);
+    int differences = 0;
+    int looseFrames = 0;
+    int plainFrames = 0;
+    int keptThroughChanges = 0;
+    for (int step = 0; step < 20000; ++step) {
+        changes.apply(table);
+        if (changes.pick(0, 2) != 0) continue;
+        const bool loose = anyLooseContact(table);
+        HIDEventRef frame = HIDEvent::create(kHIDEventTypeDigitizer, 1);
+        const int contacts = changes.pick(1, 3);
+        for (int c = 0; c < contacts; ++c) {
+            HIDEventRef contact = HIDEvent::create(kHIDEventTypeDigitizer, 1);
+            contact->setIntegerValue(changes.pick(0, 12), kHIDEventFieldDigitizerIndex);
+            contact->setIntegerValue(changes.pick(0, 3) == 0 ? 0 : 1, kHIDEventFieldDigitizerTouch);
+            contact->setDoubleValue(changes.pick(1, 99) / 100.0, kHIDEventFieldDigitizerX);
+            contact->setDoubleValue(changes.pick(1, 99) / 100.0, kHIDEventFieldDigitizerY);
+            frame->appendEvent(contact);
+        }
+        const double time = static_cast<double>(step) * 8000000.0;
+        table.unpackContactFrame(frame->copy(), time);
+        (anyLooseContact(table) || loose ? looseFrames : plainFrames) += 1;
+        const std::string difference = fastestFingerDifference(table);
+        if (!difference.empty() && differences++ < 3) ADD_FAILURE() << "step " << step << ": " << difference;
+
+        // Stored figures do not follow the paths: changes after the unpacking leave them.
+        table.unpackContactFrame(frame->copy(), time + 1.0);
+        const std::string before = fastestFingerOf(table);
+        changes.apply(table);
+        changes.apply(table);
+        if (fastestFingerOf(table) == before) ++keptThroughChanges;
+    }
+    EXPECT_EQ(differences, 0);
+    EXPECT_EQ(keptThroughChanges, looseFrames + plainFrames);
+    EXPECT_GT(looseFrames, 500);
+    EXPECT_GT(plainFrames, 500);
+}
+
+// A figure set from outside stays until the next unpacking and leaves the other as it was.
+TEST(PathWalk, FastestFingerFiguresSetFromOutsideStayUntilTheNextUnpacking) {
+    HIDPathStates table(500.0f, 1000.0f);
+    HIDEventRef frame = HIDEvent::create(kHIDEventTypeDigitizer, 1);
+    for (int c = 0; c < 2; ++c) {
+        HIDEventRef contact = HIDEvent::create(kHIDEventTypeDigitizer, 1);
+        contact->setIntegerValue(c, kHIDEventFieldDigitizerIndex);
+        contact->setIntegerValue(1, kHIDEventFieldDigitizerTouch);
+        contact->setDoubleValue(0.3 + 0.3 * c, kHIDEventFieldDigitizerX);
+        contact->setDoubleValue(0.5, kHIDEventFieldDigitizerY);
+        frame->appendEvent(contact);
+    }
+    table.unpackContactFrame(frame, 8000000.0);
+    // The second frame moves both fingers, so the damped speeds are not 0.
+    HIDEventRef moved = frame->copy();
+    for (const HIDEventRef& contact : moved->children()) {
+        contact->setDoubleValue(contact->doubleValueForField(kHIDEventFieldDigitizerX) + 0.05,
+                                kHIDEventFieldDigitizerX);
+    }
+    table.unpackContactFrame(moved, 16000000.0);
+    const HIDPoint velocity = table.dampedVelocityOfFastestFinger();
+    ASSERT_GT(table.dampedSpeedOfFastestFinger(), 0.0f);
+    ASSERT_GT(velocity.x, 0.0f);
+
+    table.setDampedSpeedOfFastestFinger(42.0f);
+    EXPECT_EQ(table.dampedSpeedOfFastestFinger(), 42.0f);
+    EXPECT_EQ(text(table.dampedVelocityOfFastestFinger()), text(velocity));
+    table.setDampedVelocityOfFastestFinger(HIDPoint{1.0f, 2.0f});
+    EXPECT_EQ(text(table.dampedVelocityOfFastestFinger()), text(HIDPoint{1.0f, 2.0f}));
+    EXPECT_EQ(table.dampedSpeedOfFastestFinger(), 42.0f);
+
+    table.unpackContactFrame(moved->copy(), 24000000.0);
+    EXPECT_NE(table.dampedSpeedOfFastestFinger(), 42.0f);
+    EXPECT_EQ(fastestFingerDifference(table), "");
 }
 
 }  // namespace
