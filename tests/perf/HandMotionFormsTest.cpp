@@ -310,6 +310,12 @@ TEST(HandMotionForms, LocationDirectionFollowsEverySetAndClear) {
     EXPECT_GT(withDirection, 5000);
 }
 
+// Everything the clipping leaves, bit for bit.
+std::string clippingStateOf(const HIDHandMotion& m) {
+    return hex(m.smoothedClippedVelocity()) + "| " + hex(m.smoothedVelocity()) + "| " + hex(m.pixelDeltas()) + "| " +
+           hex(m.pixelDeltasWithResting()) + "| " + hex(m.nondominantAxesRatio()) + hex(m.smoothedTranslationSpeed());
+}
+
 // The smoothed clipped velocity, worked out when read from the smoothed velocity and the axes
 // the clipping kept, is bit for bit what clipping it at once leaves, through every way the
 // velocities are set or cleared in between; the rest of what the clipping leaves is the same
@@ -322,6 +328,11 @@ TEST(HandMotionForms, ClippedVelocityWorkedOutWhenReadFollowsEverySetAndClear) {
     auto anyMotion = [&]() { return HIDMotion{any(), any(), any(), any()}; };
     HIDHandMotion whenRead;
     HIDHandMotion atOnce;
+    // The same change to both motions.
+    auto both = [&](const auto& change) {
+        change(whenRead);
+        change(atOnce);
+    };
     int differences = 0;
     int clips = 0;
     int kinds[4] = {0, 0, 0, 0};  // translation, scale, rotation, scale and rotation tied
@@ -329,20 +340,17 @@ TEST(HandMotionForms, ClippedVelocityWorkedOutWhenReadFollowsEverySetAndClear) {
         switch (pick(0, 11)) {
             case 0: {
                 const HIDMotion v = anyMotion();
-                whenRead.setSmoothedVelocity(v);
-                atOnce.setSmoothedVelocity(v);
+                both([&](HIDHandMotion& m) { m.setSmoothedVelocity(v); });
                 break;
             }
             case 1: {
                 const HIDMotion v = anyMotion();
-                whenRead.setSmoothedClippedVelocity(v);
-                atOnce.setSmoothedClippedVelocity(v);
+                both([&](HIDHandMotion& m) { m.setSmoothedClippedVelocity(v); });
                 break;
             }
             case 2: {
                 const bool clearLocation = pick(0, 1) == 1;
-                whenRead.clearHandMotion(clearLocation);
-                atOnce.clearHandMotion(clearLocation);
+                both([&](HIDHandMotion& m) { m.clearHandMotion(clearLocation); });
                 break;
             }
             case 3: {
@@ -353,22 +361,20 @@ TEST(HandMotionForms, ClippedVelocityWorkedOutWhenReadFollowsEverySetAndClear) {
             }
             case 4: {
                 const float separation = static_cast<float>(pick(0, 120));
-                whenRead.setInnermostOutermostSeparation_mm(separation);
-                atOnce.setInnermostOutermostSeparation_mm(separation);
+                both([&](HIDHandMotion& m) { m.setInnermostOutermostSeparation_mm(separation); });
                 break;
             }
             case 5: {
                 const HIDMotion d = anyMotion();
-                whenRead.setPixelDeltas(d);
-                atOnce.setPixelDeltas(d);
-                whenRead.setPixelDeltasWithResting(d);
-                atOnce.setPixelDeltasWithResting(d);
+                both([&](HIDHandMotion& m) {
+                    m.setPixelDeltas(d);
+                    m.setPixelDeltasWithResting(d);
+                });
                 break;
             }
             default: {
                 const HIDMotion v = anyMotion();
-                whenRead.setVelocity(v);
-                atOnce.setVelocity(v);
+                both([&](HIDHandMotion& m) { m.setVelocity(v); });
                 // Frame intervals in ticks: none, and ordinary ones of 8 ms and 11 ms.
                 const double interval = pick(0, 5) == 0 ? 0.0 : (pick(0, 1) == 0 ? 8000000.0 : 11000000.0);
                 whenRead.clipMotionToDominantAxes(interval);
@@ -387,12 +393,8 @@ TEST(HandMotionForms, ClippedVelocityWorkedOutWhenReadFollowsEverySetAndClear) {
                 break;
             }
         }
-        const std::string a = hex(whenRead.smoothedClippedVelocity()) + "| " + hex(whenRead.smoothedVelocity()) + "| " +
-                              hex(whenRead.pixelDeltas()) + "| " + hex(whenRead.pixelDeltasWithResting()) + "| " +
-                              hex(whenRead.nondominantAxesRatio()) + hex(whenRead.smoothedTranslationSpeed());
-        const std::string b = hex(atOnce.smoothedClippedVelocity()) + "| " + hex(atOnce.smoothedVelocity()) + "| " +
-                              hex(atOnce.pixelDeltas()) + "| " + hex(atOnce.pixelDeltasWithResting()) + "| " +
-                              hex(atOnce.nondominantAxesRatio()) + hex(atOnce.smoothedTranslationSpeed());
+        const std::string a = clippingStateOf(whenRead);
+        const std::string b = clippingStateOf(atOnce);
         if (a != b && differences++ < 3)
             ADD_FAILURE() << "step " << step << ":\n when read: " << a << "\n at once:   " << b;
     }
