@@ -33,7 +33,7 @@ inline constexpr const char* kRecordingFolder = ORVANE_TEST_EVEMU_RECORDINGS;
 inline constexpr const char* kOrvaneCommand = ORVANE_TEST_ORVANE_COMMAND;
 inline constexpr const char* kPlugInModule = ORVANE_PLUGIN_MODULE;
 
-// A recording of ../shared/data/evemu: the device its description gives and its events.
+// A recording of data/evemu: the device its description gives and its events.
 struct Recording {
     std::string path;
     std::string content;

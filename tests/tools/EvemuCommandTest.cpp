@@ -1,5 +1,5 @@
 // orvane frames and orvane replay on evemu recordings, run as a person runs them: the real
-// touchpad recordings kept beside the repository (../shared/data/evemu) and the hand-written
+// touchpad recordings bundled in data/evemu and the hand-written
 // ones of tests/tools/data. For each real recording the test says which gestures the
 // filter's rules give and why.
 //
