@@ -3,18 +3,25 @@
 #include <iostream>
 
 #include "InputLoader.h"
-#include "OutputFile.h"
+#include "tools/files/OutputCheck.h"
+#include "tools/files/OutputFile.h"
+#include "tools/files/TemporaryFiles.h"
 
 namespace orvane::cli {
 
 int runFrames(const FramesOptions& options) {
     std::string error;
+    if (!files::checkOutputs(inputFiles(options.input, options.evemu), {{"--out", options.out}}, &error)) {
+        std::cerr << error << '\n';
+        return 2;
+    }
+    files::TemporaryFiles::removeOnSignals();
     formats::FrameRecording recording;
     if (!loadFrameInput(options.input, options.evemu, &recording, &error)) {
         std::cerr << error << '\n';
         return 1;
     }
-    OutputFile out;
+    files::OutputFile out;
     if (!out.open(options.out, &error)) {
         std::cerr << error << '\n';
         return 1;

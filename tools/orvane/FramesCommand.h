@@ -14,7 +14,8 @@ struct FramesOptions {
     evemu::EvemuOptions evemu;  // how to read an evemu recording
 };
 
-// The process exit status: 0 on success, 1 with one line on standard error otherwise.
+// The process exit status: 0 on success; 2, with one line on standard error, for an output
+// that is one of the inputs or another output; 1 with one line for anything else.
 int runFrames(const FramesOptions& options);
 
 }  // namespace orvane::cli

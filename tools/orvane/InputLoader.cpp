@@ -1,5 +1,7 @@
 #include "InputLoader.h"
 
+#include <unistd.h>
+
 #include <iostream>
 #include <iterator>
 
@@ -10,6 +12,16 @@ namespace orvane::cli {
 
 bool loadFrameInput(const std::string& path, formats::FrameRecording* recording, std::string* error) {
     return loadFrameInput(path, evemu::EvemuOptions{}, recording, error);
+}
+
+std::vector<files::NamedPath> inputFiles(const std::string& path, const evemu::EvemuOptions& evemuOptions,
+                                         const std::string& role) {
+    std::vector<files::NamedPath> inputs{{role, path}};
+    if (!evemuOptions.descriptionPath.empty()) inputs.push_back({"--desc", evemuOptions.descriptionPath});
+    if (path != "-")
+        for (const std::string& sibling : evemu::siblingDescriptionPaths(path))
+            if (::access(sibling.c_str(), F_OK) == 0) inputs.push_back({"the description", sibling});
+    return inputs;
 }
 
 bool loadFrameInput(const std::string& path, const evemu::EvemuOptions& evemuOptions,

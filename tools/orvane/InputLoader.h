@@ -3,8 +3,10 @@
 // recording the filter would be given for it.
 
 #include <string>
+#include <vector>
 
 #include "tools/evemu/EvemuConversion.h"
+#include "tools/files/OutputCheck.h"
 #include "tools/formats/FrameRecording.h"
 
 namespace orvane::cli {
@@ -17,5 +19,11 @@ bool loadFrameInput(const std::string& path, formats::FrameRecording* recording,
 // `isEvemu` says whether INPUT was one.
 bool loadFrameInput(const std::string& path, const evemu::EvemuOptions& evemuOptions,
                     formats::FrameRecording* recording, std::string* error, bool* isEvemu = nullptr);
+
+// The files that reading INPUT may open (INPUT itself, the evemu description given with
+// --desc or lying beside it), as the command line names them, for comparing with the
+// outputs before anything is read. `role` names INPUT in messages.
+std::vector<files::NamedPath> inputFiles(const std::string& path, const evemu::EvemuOptions& evemuOptions,
+                                         const std::string& role = "INPUT");
 
 }  // namespace orvane::cli

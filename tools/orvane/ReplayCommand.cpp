@@ -9,7 +9,6 @@
 #include <vector>
 
 #include "InputLoader.h"
-#include "OutputFile.h"
 #include "ProgressLine.h"
 #include "platform/DeviceInformation.h"
 #include "platform/HIDEventDispatcher.h"
@@ -19,6 +18,9 @@
 #include "tools/analysis/Timeline.h"
 #include "tools/formats/EventJson.h"
 #include "tools/formats/EventStreamWriter.h"
+#include "tools/files/OutputCheck.h"
+#include "tools/files/OutputFile.h"
+#include "tools/files/TemporaryFiles.h"
 #include "tools/formats/LogStreamSink.h"
 #include "tools/host/PlugInHost.h"
 #include "tools/html/ReplayPage.h"
@@ -137,13 +139,18 @@ int runReplay(const ReplayOptions& options) {
         ::setenv(kInternalBuildEnvironment, "1", 1);
         Logging::setDebugEnabled(true);
     }
-    if (!options.eventsOut.empty() && options.eventsOut == options.logOut)
-        return fail("orvane: --events-out and --log-out must name different outputs");
-    if (!options.html.empty() && (options.html == options.eventsOut || options.html == options.logOut))
-        return fail("orvane: --html must name an output of its own, not that of --events-out or --log-out");
-
     std::string error;
     const std::string inputPath = options.input.empty() ? demoRecordingPath() : options.input;
+    std::vector<files::NamedPath> outputs;
+    if (!options.eventsOut.empty()) outputs.push_back({"--events-out", options.eventsOut});
+    if (!options.logOut.empty()) outputs.push_back({"--log-out", options.logOut});
+    if (!options.html.empty()) outputs.push_back({"--html", options.html});
+    if (!files::checkOutputs(inputFiles(inputPath, options.evemu, options.input.empty() ? "the demonstration" : "INPUT"),
+                             outputs, &error)) {
+        std::cerr << error << '\n';
+        return 2;
+    }
+    files::TemporaryFiles::removeOnSignals();
     formats::FrameRecording recording;
     bool isEvemu = false;
     if (!loadFrameInput(inputPath, options.evemu, &recording, &error, &isEvemu)) return fail(error);
@@ -155,7 +162,7 @@ int runReplay(const ReplayOptions& options) {
             return fail(located(recording, recording.headerLine, "the timebase can no longer be set"));
     }
 
-    OutputFile eventsFile, logFile, htmlFile;
+    files::OutputFile eventsFile, logFile, htmlFile;
     if (!options.eventsOut.empty() && !eventsFile.open(options.eventsOut, &error)) return fail(error);
     if (!options.logOut.empty() && !logFile.open(options.logOut, &error)) return fail(error);
     if (!options.html.empty() && !htmlFile.open(options.html, &error)) return fail(error);
@@ -270,12 +277,12 @@ int runReplay(const ReplayOptions& options) {
 
     const analysis::Timeline finished = timeline.finish();
     if (page) page->write(htmlFile.stream(), finished);
+    // The summary stays off standard output when a stream is written there.
+    const bool streamOnStandardOutput =
+        eventsFile.isStandardOutput() || logFile.isStandardOutput() || htmlFile.isStandardOutput();
     if (!eventsFile.commit(&error) || !logFile.commit(&error) || !htmlFile.commit(&error)) return fail(error);
 
-    // The summary stays off standard output when a stream is written there.
-    std::ostream& summary =
-        (eventsFile.isStandardOutput() || logFile.isStandardOutput() || htmlFile.isStandardOutput()) ? std::cerr
-                                                                                                     : std::cout;
+    std::ostream& summary = streamOnStandardOutput ? std::cerr : std::cout;
     printSummary(summary, recording, host, score, finished, tally, logCounts);
     return 0;
 }

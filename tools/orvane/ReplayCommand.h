@@ -22,7 +22,8 @@ struct ReplayOptions {
 // The bundled demonstration recording.
 std::string demoRecordingPath();
 
-// The process exit status: 0 on success, 1 with one line on standard error otherwise.
+// The process exit status: 0 on success; 2, with one line on standard error, for an output
+// that is one of the inputs or another output; 1 with one line for anything else.
 int runReplay(const ReplayOptions& options);
 
 }  // namespace orvane::cli
