@@ -247,8 +247,9 @@ TEST(HtmlReplayPageInBrowser, PageGoesToStandardOutputForADash) {
 TEST(HtmlReplayPageInBrowser, PageNeedsAnOutputOfItsOwn) {
     const CommandResult r = runOrvane({"replay", kRecordings + "/cypress.two-finger-tap.evemu", "--keyboard-cover",
                                        "--html", "-", "--events-out", "-"});
-    EXPECT_EQ(r.exitCode, 1);
-    EXPECT_EQ(r.err, "orvane: --html must name an output of its own, not that of --events-out or --log-out\n");
+    EXPECT_EQ(r.exitCode, 2);
+    EXPECT_EQ(r.err, "orvane: --events-out - (standard output) and --html - (standard output) are the same output; "
+                     "give each one of its own\n");
 }
 
 }  // namespace

@@ -169,7 +169,8 @@ TEST(OrvaneCommand, ReplayStreamOnStandardOutputMovesTheSummaryToStandardError) 
 
 TEST(OrvaneCommand, ReplayRefusesOneOutputForBothStreams) {
     expectOneErrorLine(runOrvane({"replay", "--events-out", "-", "--log-out", "-"}, {fakePlugIn()}),
-                       "orvane: --events-out and --log-out must name different outputs");
+                       "orvane: --events-out - (standard output) and --log-out - (standard output) are the same "
+                       "output; give each one of its own");
 }
 
 TEST(OrvaneCommand, ReplayOfAServiceTheFilterDoesNotMatchNamesTheHeader) {
